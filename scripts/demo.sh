@@ -1,0 +1,9 @@
+#!/usr/bin/env bash
+# Installs what is missing, builds, and runs the filter over the bundled sample.
+set -euo pipefail
+root=$(cd "$(dirname "$0")/.." && pwd)
+bash "$root/scripts/deps.sh"
+bash "$root/scripts/build.sh" "$root/build" -DNOCTIVA_BUILD_TESTS=OFF -DNOCTIVA_BUILD_BENCH=OFF
+mkdir -p "$root/out"
+"$root/build/host/noctiva" "$root/samples/noisy-sample.png" -o "$root/out/noisy-sample-denoised.png"
+echo "wrote $root/out/noisy-sample-denoised.png"
