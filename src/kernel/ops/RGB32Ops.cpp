@@ -1,4 +1,6 @@
 // Placeholder bodies so the kernel links while the operations are written.
+#include <cstddef>
+
 #include "kernel/PixelBlock.h"
 
 namespace KERNEL {
