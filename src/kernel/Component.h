@@ -23,11 +23,14 @@ public:
     virtual void GetBorder(int32_t& bx, int32_t& by) = 0;
     virtual void Reset() = 0;
     virtual bool ProducesOutput() { return true; }
+    // Deletes this when the last reference goes.
     void Release();
     void AddRef() { ++refCount; }
 
     int32_t RefCount() const { return refCount; }
     uint32_t Id() const { return id; }
+    // Ids come from a module-wide counter, one per constructed component.
+    static uint32_t NextId();
 
 protected:
     int32_t refCount = 0;
@@ -40,12 +43,16 @@ public:
     virtual void Process(cPixelBlock* src, cPixelBlock* dst) = 0;
     // Starts a chain expression: this pipe last, `previous` before it.
     virtual __cSyntax__* Chain(cPipe* previous);
+    __cFilterComponent__* NewNode(__cFilterComponent__* upstream) { return CreateNode(upstream); }
+    // A node over this pipe; it owns `upstream`.
     virtual __cFilterComponent__* CreateNode(__cFilterComponent__* upstream);
 };
 
 // The source side of a chain.
 class cInput : public cFilterComponent {
 public:
+    __cFilterComponent__* NewNode() { return CreateNode(); }
+    // The pipe's node over a new input node of this source.
     __cFilterComponent__* ChainInto(cPipe* pipe);
     __cSyntax__* Branch(cPipe* pipe);
     virtual cPixelBlock* GetBlock() = 0;
