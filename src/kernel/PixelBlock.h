@@ -201,6 +201,8 @@ inline cPixel& cPixelBlock::getPixel(cPixel& c, int32_t x, int32_t y) const {
     if (data == nullptr || s == 0) return c;
     const int32_t rx0 = outerRect.x0 / s, rx1 = outerRect.x1 / s;
     const int32_t ry0 = outerRect.y0 / s, ry1 = outerRect.y1 / s;
+    // No stored pixel to clamp to: a zeroed cursor, never a column of -1.
+    if (rx1 <= rx0 || ry1 <= ry0) return c;
     if (xs < rx0) {
         c.clampLeft = uint32_t(rx0 - xs);
         xs = rx0;
