@@ -1,0 +1,387 @@
+// The component graph through the kernel API: caching and change detection, borders, bypass, keys
+// and sharing, syntax objects, ownership.
+#include <gtest/gtest.h>
+
+#include <memory>
+
+#include "graph/GraphTestSupport.h"
+#include "kernel/Composite.h"
+#include "kernel/FilterAction.h"
+#include "kernel/Lab.h"
+#include "kernel/Node.h"
+#include "kernel/Syntax.h"
+#include "support/MallocHost.h"
+
+using graphtest::Image;
+using graphtest::TestPipe;
+using graphtest::widened;
+using KERNEL::cComposite;
+using KERNEL::cRect;
+
+namespace {
+
+// source -> p1 -> p2 -> p3 (p3 final), built with the syntax objects.
+struct Chain {
+    testsupport::MallocHost host;
+    Image image{40, 30, 100, 200};
+    KERNEL::cRGB32PixelBlock* source;
+    TestPipe* p1 = new TestPipe(2, 1);
+    TestPipe* p2 = new TestPipe(3, 1);
+    TestPipe* p3 = new TestPipe(0, 0);
+    std::unique_ptr<cComposite> composite = std::make_unique<cComposite>();
+
+    Chain() {
+        image.fillRandom(7);
+        source = image.block({100, 140, 200, 230}, {110, 130, 210, 220});
+        source->AddRef();  // the test's own reference, so the block outlives the chain
+        composite->SetNode(p3->Chain(p2)->Append(p1)->Terminate(source));
+    }
+    ~Chain() {
+        composite.reset();
+        source->Release();
+    }
+    KERNEL::__cPipe__* node(int i) {  // 3 = final
+        auto* n = static_cast<KERNEL::__cPipe__*>(composite->Node());
+        for (int k = 3; k > i; --k) n = static_cast<KERNEL::__cPipe__*>(n->Upstream());
+        return n;
+    }
+};
+
+TEST(Graph, SyntaxBuildsTheChainFromTheSourceUp) {
+    Chain c;
+    EXPECT_EQ(c.node(3)->Front(), c.p3);
+    EXPECT_EQ(c.node(2)->Front(), c.p2);
+    EXPECT_EQ(c.node(1)->Front(), c.p1);
+    auto* input = dynamic_cast<KERNEL::__cInput__*>(c.node(1)->Upstream());
+    ASSERT_NE(input, nullptr);
+    EXPECT_EQ(input->Front(), c.source);
+    EXPECT_EQ(c.composite->Node()->Depth(), 4);
+    for (auto* p : {c.p1, c.p2, c.p3}) EXPECT_EQ(p->RefCount(), 1);
+    EXPECT_EQ(c.source->RefCount(), 2);
+
+    uint32_t length = 0;
+    const uint32_t* key = c.composite->Node()->GetKey(length);
+    ASSERT_EQ(length, 4u);
+    EXPECT_EQ(key[0], c.p3->Id());
+    EXPECT_EQ(key[1], c.p2->Id());
+    EXPECT_EQ(key[2], c.p1->Id());
+    EXPECT_EQ(key[3], c.source->Id());
+}
+
+TEST(Graph, BordersAccumulateUpstreamAndAreUndoneAfterProcess) {
+    Chain c;
+    const cRect inner = c.source->innerRect;
+    KERNEL::cPixelBlock* out = c.composite->Evaluate();
+    ASSERT_NE(out, nullptr);
+    EXPECT_EQ(c.node(3)->BorderX(), 0);
+    EXPECT_EQ(c.node(2)->BorderX(), 3);
+    EXPECT_EQ(c.node(1)->BorderY(), 5);
+    EXPECT_EQ(c.node(1)->Upstream()->BorderX(), 5);
+    // Each stage worked on the area widened by its node's border ...
+    EXPECT_EQ(c.p1->seenSrcInner, widened(inner, 5, 5));
+    EXPECT_EQ(c.p1->seenDstInner, widened(inner, 5, 5));
+    EXPECT_EQ(c.p2->seenSrcInner, widened(inner, 3, 3));
+    EXPECT_EQ(c.p3->seenSrcInner, inner);
+    // ... and every block is back to the tile's rectangle afterwards.
+    EXPECT_EQ(out->innerRect, inner);
+    EXPECT_EQ(c.node(1)->CachedOutput()->innerRect, inner);
+    EXPECT_EQ(c.node(2)->CachedOutput()->innerRect, inner);
+    EXPECT_EQ(c.source->innerRect, inner);
+}
+
+TEST(Graph, SameGeometryAndParametersComputeOnce) {
+    Chain c;
+    KERNEL::cPixelBlock* first = c.composite->Evaluate();
+    KERNEL::cPixelBlock* second = c.composite->Evaluate();
+    EXPECT_EQ(first, second);
+    EXPECT_EQ(c.p1->calls, 1);
+    EXPECT_EQ(c.p2->calls, 1);
+    EXPECT_EQ(c.p3->calls, 1);
+    EXPECT_FALSE(c.composite->HasChanged());
+}
+
+TEST(Graph, ChangedModeRecomputesThatStageAndWhatFollows) {
+    Chain c;
+    c.composite->Evaluate();
+    c.p2->mode = 5;
+    c.composite->Evaluate();
+    EXPECT_EQ(c.p1->calls, 1);
+    EXPECT_EQ(c.p2->calls, 2);
+    EXPECT_EQ(c.p3->calls, 2);
+    c.p3->mode = 2;
+    c.composite->Evaluate();
+    EXPECT_EQ(c.p2->calls, 2);
+    EXPECT_EQ(c.p3->calls, 3);
+}
+
+TEST(Graph, ChangedSourceRectanglesRecomputeEverything) {
+    struct Case {
+        const char* what;
+        void (*change)(KERNEL::cPixelBlock*);
+    };
+    const Case cases[] = {
+        {"inner", [](KERNEL::cPixelBlock* b) { b->innerRect.x1 -= 1; }},
+        {"outer", [](KERNEL::cPixelBlock* b) { b->outerRect.y1 -= 1; }},
+        {"rowBytes", [](KERNEL::cPixelBlock* b) { b->rowBytes += 12; }},
+    };
+    for (const auto& tc : cases) {
+        SCOPED_TRACE(tc.what);
+        Chain c;
+        c.composite->Evaluate();
+        tc.change(c.source);
+        c.composite->Evaluate();
+        EXPECT_EQ(c.p1->calls, 2);
+        EXPECT_EQ(c.p3->calls, 2);
+    }
+}
+
+TEST(Graph, BypassedStageHandsItsInputOnAndIsNeverCalled) {
+    Chain c;
+    c.p2->mode = 0;
+    KERNEL::cPixelBlock* out = c.composite->Evaluate();
+    EXPECT_EQ(c.p2->calls, 0);
+    EXPECT_EQ(c.node(2)->CachedOutput(), c.node(1)->CachedOutput());
+    EXPECT_EQ(c.p3->seenSrcInner, c.source->innerRect);
+    ASSERT_NE(out, nullptr);
+}
+
+TEST(Graph, AllBypassedHandsOnTheSourceViewUntilAStageIsSwitchedOn) {
+    Chain d;
+    d.p1->mode = d.p2->mode = d.p3->mode = 0;
+    KERNEL::cPixelBlock* view = d.composite->Evaluate();
+    ASSERT_NE(view, nullptr);
+    EXPECT_EQ(view->data, d.source->data);
+    EXPECT_EQ(d.p1->calls + d.p2->calls + d.p3->calls, 0);
+
+    // And back on: only now is it computed.
+    d.p2->mode = 1;
+    d.composite->Evaluate();
+    EXPECT_EQ(d.p2->calls, 1);
+    EXPECT_EQ(d.p1->calls, 0);
+}
+
+TEST(Graph, InvalidateAndFreeDropsEveryCachedOutput) {
+    Chain c;
+    c.composite->Evaluate();
+    c.composite->InvalidateAndFree();
+    EXPECT_EQ(c.node(3)->CachedOutput(), nullptr);
+    EXPECT_EQ(c.node(1)->CachedOutput(), nullptr);
+    c.composite->Evaluate();
+    EXPECT_EQ(c.p1->calls, 2);
+    EXPECT_EQ(c.p3->calls, 2);
+}
+
+TEST(Graph, ResetReachesEveryFront) {
+    Chain c;
+    c.composite->Reset();
+    EXPECT_EQ(c.p1->resets + c.p2->resets + c.p3->resets, 3);
+}
+
+TEST(Graph, OwnershipIsLeakFree) {
+    const int before = graphtest::liveComponents();
+    {
+        testsupport::MallocHost host;
+        Image image(20, 20);
+        auto* source = image.block();
+        auto composite = std::make_unique<cComposite>();
+        composite->SetNode((new TestPipe(1, 1))->Chain(new TestPipe(1, 1))->Append(new TestPipe(0, 0))->Terminate(source));
+        EXPECT_EQ(graphtest::liveComponents(), before + 3);
+        composite->Evaluate();
+        composite->Evaluate();
+        EXPECT_GT(host.liveBuffers(), 0u);
+        // A new chain replaces the old one: the old nodes and their fronts go.
+        auto* source2 = image.block();
+        composite->SetNode((new TestPipe(0, 0))->Chain(new TestPipe(0, 0))->Terminate(source2));
+        EXPECT_EQ(graphtest::liveComponents(), before + 2);
+        EXPECT_EQ(host.liveBuffers(), 0u);
+        composite->Evaluate();
+        composite.reset();
+        EXPECT_EQ(graphtest::liveComponents(), before);
+        EXPECT_EQ(host.liveBuffers(), 0u);
+    }
+}
+
+TEST(Graph, ExceptionInProcessRestoresRectanglesAndLeaksNothing) {
+    struct Throwing : TestPipe {
+        using TestPipe::TestPipe;
+        void Process(KERNEL::cPixelBlock*, KERNEL::cPixelBlock*) override { throw std::runtime_error("boom"); }
+    };
+    testsupport::MallocHost host;
+    Image image(20, 20);
+    auto* source = image.block({0, 20, 0, 20}, {5, 15, 5, 15});
+    source->AddRef();
+    {
+        cComposite composite;
+        composite.SetNode((new Throwing(4))->Chain(new TestPipe(2, 0))->Terminate(source));
+        EXPECT_THROW(composite.Evaluate(), std::runtime_error);
+        EXPECT_EQ(source->innerRect, (cRect{5, 15, 5, 15}));
+        auto* mid = static_cast<KERNEL::__cPipe__*>(static_cast<KERNEL::__cPipe__*>(composite.Node())->Upstream());
+        EXPECT_EQ(mid->CachedOutput()->innerRect, (cRect{5, 15, 5, 15}));
+    }
+    EXPECT_EQ(host.liveBuffers(), 0u);
+    source->Release();
+}
+
+TEST(Graph, ShareUpstreamTakesAnEqualKeyedNodeWithoutOwningIt) {
+    testsupport::MallocHost host;
+    Image image(10, 10);
+    auto* source = image.block();
+    auto* a = new TestPipe(0, 0);
+    auto* b = new TestPipe(0, 0);
+    // Two chains over the same fronts: b <- a <- source, twice.
+    auto* chain1 = static_cast<KERNEL::__cPipe__*>(b->Chain(a)->Terminate(source));
+    auto* chain2 = static_cast<KERNEL::__cPipe__*>(b->Chain(a)->Terminate(source));
+    uint32_t l1 = 0, l2 = 0;
+    chain1->BuildKey(l1);
+    chain2->BuildKey(l2);
+    auto* aNode1 = chain1->Upstream();
+    EXPECT_TRUE(chain2->ShareUpstream(aNode1));
+    EXPECT_EQ(chain2->Upstream(), aNode1);
+    EXPECT_FALSE(chain2->OwnsUpstream());
+    // A node never takes itself or its own upstream.
+    EXPECT_FALSE(chain1->ShareUpstream(chain1));
+    EXPECT_FALSE(chain1->ShareUpstream(aNode1));
+    delete chain2;  // does not delete the shared node
+    EXPECT_EQ(a->RefCount(), 1);
+    delete chain1;
+    EXPECT_EQ(host.liveBuffers(), 0u);
+}
+
+TEST(Graph, BranchGrowsAPipeOnASourceOrOnAnExistingNode) {
+    const int before = graphtest::liveComponents();
+    testsupport::MallocHost host;
+    Image image(10, 10);
+    auto* source = image.block();
+    auto* p = new TestPipe(0, 0);
+    auto* node = static_cast<KERNEL::__cPipe__*>(source->Branch(p)->Build(nullptr));
+    EXPECT_EQ(node->Front(), p);
+    EXPECT_TRUE(node->OwnsUpstream());
+    auto* q = new TestPipe(0, 0);
+    auto* shared = static_cast<KERNEL::__cPipe__*>(node->Branch(q)->Build(nullptr));
+    EXPECT_EQ(shared->Upstream(), node);
+    EXPECT_FALSE(shared->OwnsUpstream());
+    delete shared;
+    delete node;
+    EXPECT_EQ(graphtest::liveComponents(), before);
+}
+
+}  // namespace
+
+// ---- Through the filter action: tiles, caching across Apply, no seams.
+
+namespace {
+
+struct ActionChain {
+    std::unique_ptr<cRGB32FilterAction> action = std::make_unique<cRGB32FilterAction>();
+    TestPipe* p1;
+    TestPipe* p2;
+    ActionChain(int32_t k) : p1(new TestPipe(k, k)), p2(new TestPipe(k, k)) {
+        p1->offset = 1;  // so that a skipped stage shows
+        action->SetNode((new cLAB2RGB)
+                            ->Chain(p2)
+                            ->Append(p1)
+                            ->Append(new cRGB2LAB)
+                            ->Terminate(action->GetSourceBlock()));
+    }
+};
+
+// Applies the chain tile by tile (core `tile`, overlap `overlap`, both clipped to the image).
+void applyTiled(ActionChain& c, Image& in, Image& out, int32_t tile, int32_t overlap) {
+    std::unique_ptr<KERNEL::cPixelBlock> dst(out.block());
+    for (int32_t y = in.y; y < in.y + in.height; y += tile)
+        for (int32_t x = in.x; x < in.x + in.width; x += tile) {
+            const cRect core{int16_t(x), int16_t(std::min(x + tile, in.x + in.width)), int16_t(y),
+                             int16_t(std::min(y + tile, in.y + in.height))};
+            const cRect outer{int16_t(std::max(x - overlap, in.x)),
+                              int16_t(std::min(core.x1 + overlap, in.x + in.width)),
+                              int16_t(std::max(y - overlap, in.y)),
+                              int16_t(std::min(core.y1 + overlap, in.y + in.height))};
+            std::unique_ptr<KERNEL::cPixelBlock> src(in.block(outer, core));
+            c.action->Apply(src.get(), dst.get());
+        }
+}
+
+TEST(GraphAction, TiledEqualsWholeBlockPixelForPixel) {
+    testsupport::MallocHost host;
+    const int32_t k = 8;  // two stages of reach 8: 3k stays inside the overlap of 50
+    Image in(173, 151, 30, 40);
+    in.fillRandom(11);
+
+    Image whole(173, 151, 30, 40), tiled(173, 151, 30, 40);
+    {
+        ActionChain c(k);
+        std::unique_ptr<KERNEL::cPixelBlock> src(in.block()), dst(whole.block());
+        c.action->Apply(src.get(), dst.get());
+        EXPECT_EQ(c.p1->calls, 1);
+    }
+    for (int32_t tile : {50, 64, 200}) {
+        SCOPED_TRACE(tile);
+        std::fill(tiled.samples.begin(), tiled.samples.end(), -1);
+        ActionChain c(k);
+        applyTiled(c, in, tiled, tile, 50);
+        ASSERT_EQ(tiled.samples, whole.samples);
+    }
+    EXPECT_EQ(host.liveBuffers(), 0u);
+
+    // The chain is not the identity, or the comparison would prove little.
+    EXPECT_NE(whole.samples, in.samples);
+}
+
+TEST(GraphAction, SameTileTwiceComputesOnceAndANewTileRecomputes) {
+    testsupport::MallocHost host;
+    ActionChain c(2);
+    Image in(60, 60), out(60, 60);
+    in.fillRandom(5);
+    std::unique_ptr<KERNEL::cPixelBlock> dst(out.block());
+    std::unique_ptr<KERNEL::cPixelBlock> a(in.block({0, 60, 0, 60}, {10, 40, 10, 40}));
+    std::unique_ptr<KERNEL::cPixelBlock> b(in.block({0, 60, 0, 60}, {20, 50, 10, 40}));
+    c.action->Apply(a.get(), dst.get());
+    c.action->Apply(a.get(), dst.get());
+    EXPECT_EQ(c.p1->calls, 1);
+    EXPECT_EQ(c.p2->calls, 1);
+    c.action->Apply(b.get(), dst.get());
+    EXPECT_EQ(c.p1->calls, 2);
+    // The descriptor block is empty between tiles; the working blocks are gone.
+    EXPECT_EQ(c.action->GetSourceBlock()->data, nullptr);
+    EXPECT_EQ(c.action->GetSourceBlock()->sampling, 0);
+    EXPECT_EQ(c.action->GetSourceBlock()->memory, nullptr);
+    c.action->InvalidateAndFree();
+    EXPECT_EQ(host.liveBuffers(), 0u);
+}
+
+TEST(GraphAction, ApplyWritesOnlyTheCoreAndNothingWhenDisabled) {
+    testsupport::MallocHost host;
+    ActionChain c(1);
+    Image in(30, 30), out(30, 30);
+    in.fillRandom(8);
+    std::fill(out.samples.begin(), out.samples.end(), -7);
+    std::unique_ptr<KERNEL::cPixelBlock> src(in.block({0, 30, 0, 30}, {5, 20, 8, 25})), dst(out.block());
+    c.action->Disable();
+    c.action->Apply(src.get(), dst.get());
+    EXPECT_EQ(c.p1->calls, 0);
+    EXPECT_TRUE(std::all_of(out.samples.begin(), out.samples.end(), [](int32_t v) { return v == -7; }));
+    c.action->Enable();
+    c.action->Apply(src.get(), dst.get());
+    for (int32_t y = 0; y < 30; ++y)
+        for (int32_t x = 0; x < 30; ++x) {
+            const bool core = x >= 5 && x < 20 && y >= 8 && y < 25;
+            ASSERT_EQ(out.at(x, y)[0] != -7, core) << x << "," << y;
+        }
+}
+
+TEST(GraphAction, DeletingTheActionReleasesEverything) {
+    const int before = graphtest::liveComponents();
+    testsupport::MallocHost host;
+    {
+        ActionChain c(3);
+        Image in(40, 40), out(40, 40);
+        std::unique_ptr<KERNEL::cPixelBlock> src(in.block()), dst(out.block());
+        c.action->Apply(src.get(), dst.get());
+        EXPECT_GT(host.liveBuffers(), 0u);  // the cached stage outputs
+        EXPECT_EQ(graphtest::liveComponents(), before + 2);
+    }
+    EXPECT_EQ(graphtest::liveComponents(), before);
+    EXPECT_EQ(host.liveBuffers(), 0u);
+}
+
+}  // namespace
