@@ -1,10 +1,12 @@
 #include "steps/ShadowChain.h"
 
+#include <cstddef>
 #include <memory>
 
 #include "kernel/FilterAction.h"
 #include "kernel/Lab.h"
 #include "kernel/Node.h"
+#include "kernel/PixelBlock.h"
 #include "kernel/Syntax.h"
 #include "steps/Step1.h"
 #include "steps/Step2.h"

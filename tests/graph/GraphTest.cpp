@@ -303,7 +303,7 @@ void applyTiled(ActionChain& c, Image& in, Image& out, int32_t tile, int32_t ove
 
 TEST(GraphAction, TiledEqualsWholeBlockPixelForPixel) {
     testsupport::MallocHost host;
-    const int32_t k = 8;  // two stages of reach 8: 3k stays inside the overlap of 50
+    const int32_t k = 8;  // two stages of reach 8: the core needs 2k of real input, well inside the overlap of 50
     Image in(173, 151, 30, 40);
     in.fillRandom(11);
 

@@ -1,0 +1,301 @@
+// The shadow chain: its parameter text (order, defaults, reading rules, bounds), the parameter table,
+// borders, the bypassed chain as the Lab round trip, and ownership.
+#include <gtest/gtest.h>
+
+#include <cstring>
+#include <memory>
+#include <sstream>
+#include <string>
+#include <vector>
+
+#include "graph/GraphTestSupport.h"
+#include "kernel/FilterAction.h"
+#include "kernel/Lab.h"
+#include "steps/ParameterTable.h"
+#include "steps/ShadowChain.h"
+#include "steps/Step1.h"
+#include "steps/Step2.h"
+#include "steps/Step3.h"
+#include "steps/Step4.h"
+#include "support/MallocHost.h"
+
+using graphtest::Image;
+using KERNEL::cRect;
+
+namespace {
+
+int& stepsAlive() {
+    static int n = 0;
+    return n;
+}
+template <class Step>
+struct Counted : Step {
+    Counted(KERNEL::cHost* host) : Step(nullptr, host, nullptr, nullptr) { ++stepsAlive(); }
+    ~Counted() override { --stepsAlive(); }
+};
+
+// Steps as the filter object makes them: default fields, step 2 in mode 104.
+struct Shadow {
+    testsupport::MallocHost host;
+    Counted<cStep1>* step1 = new Counted<cStep1>(&host);
+    Counted<cStep2>* step2 = new Counted<cStep2>(&host);
+    Counted<cStep3>* step3 = new Counted<cStep3>(&host);
+    Counted<cStep4>* step4 = new Counted<cStep4>(&host);
+    std::unique_ptr<cRGB32FilterAction> action;
+
+    Shadow() {
+        step2->mode = 104;
+        action.reset(buildShadowAction(step1, step2, step3, step4));
+    }
+    // Field i of the text, in text order.
+    int32_t* field(int i) { return fields()[size_t(i)]; }
+    std::vector<int32_t*> fields() {
+        std::vector<int32_t*> f;
+        auto& s4 = *step4;
+        auto& s3 = *step3;
+        auto& s2 = *step2;
+        auto& s1 = *step1;
+        for (int32_t* p : {&s4.blackLevel1, &s4.whiteLevel1, &s4.curveStrength2, &s4.blackLevel2, &s4.whiteLevel2,
+                           &s4.gradientLevel3, &s4.curveStrength3, &s4.blackPoint5, &s4.whitePoint5, &s4.toneRed5,
+                           &s4.toneBlue5, &s4.toneSelector4, &s4.liftAmount4, &s4.darkenAmount4, &s4.mode,
+                           &s3.gradeMix, &s3.saturationPercent, &s3.warmthPercent, &s3.shiftStrength3,
+                           &s3.shiftBase3, &s3.shiftLevelR3, &s3.shiftLevelG3, &s3.shiftLevelB3,
+                           &s3.shiftStrength4, &s3.shiftBase4, &s3.shiftLevelR4, &s3.shiftLevelG4,
+                           &s3.shiftLevelB4, &s3.toneSelector, &s3.toneAmount0, &s3.toneAmount1, &s3.toneAmount2,
+                           &s3.toneAmount3, &s3.mode, &s2.impulseLevel, &s2.impulseFlatness, &s2.lumaMedianRadius,
+                           &s2.lumaMedianKeep, &s2.rankPreset3, &s2.smoothThreshold4, &s2.smoothStrength4,
+                           &s2.edgeLimit5, &s2.lumaKeepPercent5, &s2.rankPreset6, &s2.colourTolerance7,
+                           &s2.waveletStrength7, &s2.referenceRed7, &s2.referenceGreen7, &s2.referenceBlue7,
+                           &s2.preset9, &s2.mode, &s1.medianRadius1, &s1.medianRadius2, &s1.chromaLimitPercent,
+                           &s1.edgeStrength, &s1.medianRadius4, &s1.preset3, &s1.mode})
+            f.push_back(p);
+        return f;
+    }
+};
+
+struct Entry {
+    std::string name;
+    int32_t value;
+};
+
+// Splits " name value  name value " strictly: every entry is blank, name, blank, value, blank.
+std::vector<Entry> parseEntries(const std::string& text) {
+    std::vector<Entry> entries;
+    size_t i = 0;
+    while (i < text.size()) {
+        EXPECT_EQ(text[i], ' ');
+        const size_t nameEnd = text.find(' ', i + 1);
+        const size_t valueEnd = text.find(' ', nameEnd + 1);
+        if (nameEnd == std::string::npos || valueEnd == std::string::npos) {
+            ADD_FAILURE() << "unterminated entry at " << i;
+            break;
+        }
+        entries.push_back({text.substr(i + 1, nameEnd - i - 1), std::stoi(text.substr(nameEnd + 1, valueEnd - nameEnd - 1))});
+        i = valueEnd + 1;
+    }
+    return entries;
+}
+
+TEST(ShadowChain, WritesFiftyEightEntriesInOrderWithTheDefaults) {
+    Shadow s;
+    const std::string text = writeShadowParameters(*s.action);
+    const auto entries = parseEntries(text);
+    const auto table = shadowParameterTable();
+    ASSERT_EQ(entries.size(), kShadowParameterCount);
+    ASSERT_EQ(table.size(), kShadowParameterCount);
+    for (size_t i = 0; i < entries.size(); ++i) {
+        SCOPED_TRACE(i);
+        EXPECT_EQ(entries[i].name, "Parameter" + std::to_string(i));
+        EXPECT_EQ(entries[i].value, table[i].defaultValue) << table[i].name;
+        EXPECT_EQ(table[i].number, int32_t(i));
+    }
+    EXPECT_EQ(entries[50].value, 104);
+    EXPECT_EQ(entries[14].value, 0);
+    EXPECT_EQ(entries[33].value, 0);
+    EXPECT_EQ(entries[57].value, 0);
+    EXPECT_LE(text.size(), s.action->ParameterTextLength());
+    EXPECT_EQ(text.substr(0, 15), " Parameter0 0  ");
+}
+
+TEST(ShadowChain, TableNamesTheFieldsTheTextCarries) {
+    // Setting a field through its table entry's position moves exactly that entry of the text.
+    Shadow s;
+    const auto table = shadowParameterTable();
+    EXPECT_STREQ(table[50].name, "step2.mode");
+    EXPECT_STREQ(table[34].name, "step2.impulseLevel");
+    EXPECT_STREQ(table[11].name, "step4.toneSelector4");
+    EXPECT_EQ(findShadowParameter("step1.mode"), &table[57]);
+    EXPECT_EQ(findShadowParameter("Parameter5"), &table[5]);
+    EXPECT_EQ(findShadowParameter("Parameter58"), nullptr);
+    EXPECT_EQ(findShadowParameter("Parameter5x"), nullptr);
+    EXPECT_EQ(findShadowParameter("step9.mode"), nullptr);
+    for (size_t i = 0; i < table.size(); ++i) {
+        SCOPED_TRACE(table[i].name);
+        EXPECT_EQ(*s.field(int(i)), table[i].defaultValue);
+        EXPECT_NE(std::strlen(table[i].description), 0u);
+    }
+}
+
+TEST(ShadowChain, ReadingBackReproducesEveryField) {
+    Shadow a;
+    int32_t v = -29;
+    for (int32_t* f : a.fields()) *f = (v += 1237) * ((v & 1) ? -1 : 1);
+    *a.field(0) = INT32_MIN;
+    *a.field(1) = INT32_MAX;
+    const std::string text = writeShadowParameters(*a.action);
+
+    Shadow b;
+    readShadowParameters(*b.action, text.c_str());
+    for (int i = 0; i < int(kShadowParameterCount); ++i) EXPECT_EQ(*b.field(i), *a.field(i)) << i;
+    EXPECT_EQ(writeShadowParameters(*b.action), text);
+}
+
+TEST(ShadowChain, EmptyTextChangesNothing) {
+    Shadow s;
+    const std::string before = writeShadowParameters(*s.action);
+    readShadowParameters(*s.action, "");
+    readShadowParameters(*s.action, "   ");
+    EXPECT_EQ(writeShadowParameters(*s.action), before);
+}
+
+std::string entryText(int n, int32_t value) {
+    return " Parameter" + std::to_string(n) + " " + std::to_string(value) + " ";
+}
+
+TEST(ShadowChain, MissingEntryKeepsItsFieldAndStillConsumesItsNumber) {
+    Shadow s;
+    std::string text;
+    for (int i = 0; i < int(kShadowParameterCount); ++i)
+        if (i != 12) text += entryText(i, 1000 + i);
+    *s.field(12) = -5;
+    readShadowParameters(*s.action, text.c_str());
+    EXPECT_EQ(*s.field(12), -5);
+    for (int i = 0; i < int(kShadowParameterCount); ++i)
+        if (i != 12) EXPECT_EQ(*s.field(i), 1000 + i) << i;
+}
+
+TEST(ShadowChain, MissingEntryFiveTakesTheDigitAfterParameter5Of50) {
+    // The reading rule is a plain substring search: "Parameter5" first matches inside "Parameter50",
+    // the value parsed just after it is the digit 0, and the cursor then stands inside that name, so
+    // entries 6 to 50 are not found and keep their values.
+    Shadow s;
+    std::string text;
+    for (int i = 0; i < int(kShadowParameterCount); ++i)
+        if (i != 5) text += entryText(i, i == 50 ? 104 : 2000 + i);
+    for (int i = 0; i < int(kShadowParameterCount); ++i) *s.field(i) = -1 - i;
+    readShadowParameters(*s.action, text.c_str());
+    for (int i = 0; i < 5; ++i) EXPECT_EQ(*s.field(i), 2000 + i) << i;
+    EXPECT_EQ(*s.field(5), 0);
+    for (int i = 6; i <= 50; ++i) EXPECT_EQ(*s.field(i), -1 - i) << i;
+    for (int i = 51; i < int(kShadowParameterCount); ++i) EXPECT_EQ(*s.field(i), 2000 + i) << i;
+}
+
+TEST(ShadowChain, BoundedWriteNeverPassesTheCapacity) {
+    Shadow s;
+    for (int32_t* f : s.fields()) *f = -2000000000;  // the longest values
+    const std::string full = writeShadowParameters(*s.action);
+    ASSERT_LE(full.size(), s.action->ParameterTextLength());
+    for (size_t capacity : {size_t(0), size_t(1), size_t(2), size_t(30), size_t(31), size_t(100), full.size(),
+                            full.size() + 1, size_t(10096)}) {
+        SCOPED_TRACE(capacity);
+        std::vector<char> buffer(capacity + 16, '#');
+        const size_t length = writeShadowParameters(*s.action, buffer.data(), capacity);
+        if (capacity == 0) {
+            EXPECT_EQ(length, 0u);
+            EXPECT_EQ(buffer[0], '#');
+            continue;
+        }
+        ASSERT_LT(length, capacity);
+        EXPECT_EQ(buffer[length], '\0');
+        EXPECT_EQ(full.compare(0, length, buffer.data(), length), 0);
+        for (size_t i = capacity; i < buffer.size(); ++i) ASSERT_EQ(buffer[i], '#') << i;
+        if (capacity > full.size()) {
+            EXPECT_EQ(length, full.size());
+        }
+    }
+}
+
+TEST(ShadowChain, BordersPerNodeAndTheWideVariant) {
+    for (int32_t mode : {104, 108}) {
+        SCOPED_TRACE(mode);
+        Shadow s;
+        s.step2->mode = mode;
+        Image in(20, 20), out(20, 20);
+        std::unique_ptr<KERNEL::cPixelBlock> src(in.block()), dst(out.block());
+        s.action->Apply(src.get(), dst.get());
+        const int32_t wide = mode == 108 ? 10 : 0;
+        // From the final node (step 4) to the input node.
+        const int32_t expected[] = {0, 0, 0, 20 + wide, 30 + wide, 30 + wide, 30 + wide};
+        KERNEL::__cFilterComponent__* node = s.action->Composite().Node();
+        for (int32_t e : expected) {
+            ASSERT_NE(node, nullptr);
+            EXPECT_EQ(node->BorderX(), e);
+            EXPECT_EQ(node->BorderY(), e);
+            auto* pipe = dynamic_cast<KERNEL::__cPipe__*>(node);
+            node = pipe ? pipe->Upstream() : nullptr;
+        }
+        EXPECT_EQ(node, nullptr);
+    }
+}
+
+TEST(ShadowChain, AllStepsBypassedIsTheLabRoundTrip) {
+    Shadow s;
+    s.step2->mode = 0;
+    Image in(37, 23, 5, 9), out(37, 23, 5, 9);
+    in.fillRandom(21);
+    const int32_t white[3] = {65535, 65535, 65535};
+    std::copy(white, white + 3, in.at(10, 12));
+    std::fill(out.samples.begin(), out.samples.end(), -9);
+    const cRect core{8, 40, 11, 30};
+    std::unique_ptr<KERNEL::cPixelBlock> src(in.block({5, 42, 9, 32}, core)), dst(out.block());
+    s.action->Apply(src.get(), dst.get());
+    for (int32_t y = 9; y < 32; ++y)
+        for (int32_t x = 5; x < 42; ++x) {
+            const bool inCore = x >= core.x0 && x < core.x1 && y >= core.y0 && y < core.y1;
+            const int32_t* p = in.at(x, y);
+            int32_t L, a, b, e[3];
+            KERNEL::lab::toLab(p[0], p[1], p[2], L, a, b);
+            KERNEL::lab::toRGB(L, a, b, e[0], e[1], e[2]);
+            for (int k = 0; k < 3; ++k) ASSERT_EQ(out.at(x, y)[k], inCore ? e[k] : -9) << x << "," << y << "," << k;
+        }
+    EXPECT_EQ(out.at(10, 12)[0], 65268);
+    EXPECT_EQ(out.at(10, 12)[1], 65301);
+    EXPECT_EQ(out.at(10, 12)[2], 65301);
+}
+
+TEST(ShadowChain, StepModeFromTheTextActivatesTheStep) {
+    Shadow s;
+    s.step2->mode = 0;
+    Image in(16, 16), out(16, 16);
+    std::unique_ptr<KERNEL::cPixelBlock> src(in.block()), dst(out.block());
+    s.action->Apply(src.get(), dst.get());
+    const size_t cached = s.host.liveBuffers();
+    // A complete text: alone, "Parameter57" would be taken by the search for "Parameter5".
+    std::string text = writeShadowParameters(*s.action);
+    const size_t at = text.rfind(entryText(57, 0));
+    ASSERT_NE(at, std::string::npos);
+    text.replace(at, std::string::npos, entryText(57, 3));
+    readShadowParameters(*s.action, text.c_str());
+    EXPECT_EQ(s.step1->mode, 3);
+    EXPECT_TRUE(s.action->HasChanged());
+    s.action->Apply(src.get(), dst.get());
+    EXPECT_GT(s.host.liveBuffers(), cached);  // step 1 now keeps an output of its own
+}
+
+TEST(ShadowChain, DeletingTheActionDeletesStepsConvertersAndBuffers) {
+    const int before = stepsAlive();
+    {
+        Shadow s;
+        EXPECT_EQ(stepsAlive(), before + 4);
+        EXPECT_EQ(s.step2->RefCount(), 1);
+        Image in(64, 48), out(64, 48);
+        in.fillRandom(2);
+        std::unique_ptr<KERNEL::cPixelBlock> src(in.block({0, 64, 0, 48}, {10, 54, 10, 38})), dst(out.block());
+        s.action->Apply(src.get(), dst.get());
+        s.action.reset();
+        EXPECT_EQ(stepsAlive(), before);
+        EXPECT_EQ(s.host.liveBuffers(), 0u);
+    }
+}
+
+}  // namespace
