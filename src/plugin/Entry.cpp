@@ -3,6 +3,7 @@
 #include <exception>
 #include <new>
 
+#include "kernel/Host.h"
 #include "kernel/Memory/MEM.h"
 #include "plugin/Filter.h"
 #include "plugin/PluginState.h"

@@ -306,13 +306,13 @@ void cFilter::SetParameterText(char* text) {
     std::memcpy(&head, text, 4);
     if (head != byteSwap(signature) && head != signature) return;
     std::memmove(text, text + 4, std::strlen(text + 4) + 1);
-    if (cFilterAction* a = GetAction()) readParameterText(a, text);
+    if (cFilterAction* a = GetAction()) a->ReadParameters(text);
 }
 
 void cFilter::GetParameterText(char* buffer, std::size_t capacity) {
     cFilterAction* a = GetAction();
     if (a == nullptr || capacity < 5) return;
-    writeParameterText(a, buffer + 4, capacity - 4);
+    a->WriteParameters(buffer + 4, capacity - 4);
     // "vek " in text order is the signature stored byte-swapped on this little-endian machine.
     const uint32_t head = byteSwap(signature);
     std::memcpy(buffer, &head, 4);
