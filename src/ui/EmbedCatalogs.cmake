@@ -1,0 +1,25 @@
+# Turns the catalogue files into C++ pieces for the module's built-in catalogues.
+# cmake -DOUTPUT=<file.inc> -DQUELL2=<Quell2.loc> -DCOMMONCTRL=<CommonCtrl.loc> -P EmbedCatalogs.cmake
+function(embed variable file out)
+  file(READ "${file}" hex HEX)
+  string(LENGTH "${hex}" length)
+  set(text "inline constexpr std::string_view ${variable}[] = {\n")
+  set(offset 0)
+  # 1024 bytes a piece: well under every compiler's limit on one string literal.
+  while(offset LESS length)
+    string(SUBSTRING "${hex}" ${offset} 2048 piece)
+    string(LENGTH "${piece}" pieceLength)
+    math(EXPR bytes "${pieceLength} / 2")
+    string(REGEX REPLACE "([0-9a-f][0-9a-f])" "\\\\x\\1" piece "${piece}")
+    string(APPEND text "    std::string_view(\"${piece}\", ${bytes}),\n")
+    math(EXPR offset "${offset} + 2048")
+  endwhile()
+  string(APPEND text "};\n")
+  set(${out} "${text}" PARENT_SCOPE)
+endfunction()
+
+embed(kQuell2Pieces "${QUELL2}" quell2)
+embed(kCommonCtrlPieces "${COMMONCTRL}" commonCtrl)
+file(WRITE "${OUTPUT}.tmp" "// Generated from the catalogue files in loc/; do not edit.\n#pragma once\n#include <string_view>\n\n${quell2}\n${commonCtrl}")
+file(COPY_FILE "${OUTPUT}.tmp" "${OUTPUT}" ONLY_IF_DIFFERENT)
+file(REMOVE "${OUTPUT}.tmp")
