@@ -1,0 +1,101 @@
+// One run of a filter module over an image, the way a scripting host runs a hidden filter:
+// Prepare, Start, Continue while a rectangle is requested, Finish.
+//
+// The Session owns the FilterRecord, every callback suite and the tile buffers. Callbacks are
+// plain C function pointers; they reach the running session through a thread-local pointer, so
+// one session runs at a time per thread.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <optional>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "hostapi/HostInterface.h"
+#include "noctiva/host/Image.h"
+
+namespace noctiva::host {
+
+struct Selection {
+    int x = 0, y = 0, width = 0, height = 0;
+};
+
+struct RunOptions {
+    std::optional<Selection> selection;  // default: the whole image
+    std::optional<std::string> par1;     // scripting text handed in under 'par1'
+    std::optional<std::int32_t> dRes;    // integer handed in under 'dRes'
+    int resolutionDpi = 72;
+
+    // Fault provocation and checking.
+    bool relocateHandles = false;              // move every unlocked handle between entry calls
+    std::optional<std::size_t> bufferCap;      // total live bytes the buffer suite hands out
+    int failBufferAllocation = 0;              // 1-based: this allocation fails (0 = never)
+    int failBufferLock = 0;                    // 1-based: this lock fails (0 = never)
+    int failHandleAllocation = 0;              // 1-based: this newProc returns null (0 = never)
+    bool failOnLeak = false;                   // a handle or buffer left behind fails the run
+    long maxContinueCalls = 1'000'000;         // a module that never empties its rectangles
+
+    std::function<void(std::int32_t done, std::int32_t total)> onProgress;
+};
+
+struct LeakReport {
+    int handles = 0;
+    std::size_t handleBytes = 0;
+    int buffers = 0;
+    std::size_t bufferBytes = 0;
+    int readTokens = 0;
+    int writeTokens = 0;
+    bool any() const { return handles || buffers || readTokens || writeTokens; }
+    std::string describe() const;
+};
+
+struct RunResult {
+    pi::OSErr result = pi::noErr;  // first non-zero module result
+    std::string failedSelector;    // where `result` came from
+    std::string hostError;         // a fault the host detected (bad request, endless run, leak)
+    std::string par1Out = "none";  // the 'par1' text the module recorded at Finish
+    LeakReport leaks;
+
+    std::vector<std::pair<std::int32_t, std::int32_t>> progress;
+    long continueCalls = 0;
+    long advanceStateCalls = 0;
+    long colorServiceCalls = 0;
+    long handleMoves = 0;          // relocations performed
+    long tilesServed = 0;          // rectangles filled for the module
+    long protocolWarnings = 0;     // unknown handles/buffers passed back, double frees
+
+    bool ok() const { return result == pi::noErr && hostError.empty(); }
+    // One line: the module code with its meaning, or the host's finding.
+    std::string message() const;
+};
+
+// Short meaning of a result code ("out of memory" for -108, ...).
+std::string describeResult(pi::OSErr code);
+
+class Session {
+public:
+    // `image` is the destination: the filter's output is written into it.
+    Session(Image& image, RunOptions options);
+    ~Session();
+    Session(const Session&) = delete;
+    Session& operator=(const Session&) = delete;
+
+    RunResult run(PluginEntryProc entry);
+
+    // The About selector: an about record only, no filter record, no data cell kept.
+    static pi::OSErr about(PluginEntryProc entry);
+
+    class Impl;
+
+private:
+    std::unique_ptr<Impl> impl_;
+};
+
+// Convenience: one Session, one run.
+RunResult runFilter(PluginEntryProc entry, Image& image, const RunOptions& options = {});
+
+}  // namespace noctiva::host

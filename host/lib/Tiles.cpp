@@ -1,0 +1,96 @@
+#include "Tiles.h"
+
+#include <algorithm>
+#include <cstring>
+
+namespace noctiva::host {
+
+Area Area::intersect(const Area& o) const {
+    return {std::max(top, o.top), std::max(left, o.left), std::min(bottom, o.bottom), std::min(right, o.right)};
+}
+
+std::int32_t paddedRowBytes(int width, int pixelBytes) {
+    const std::int64_t tight = std::int64_t(width) * pixelBytes;
+    return std::int32_t((tight + 15) / 16 * 16 + 16);
+}
+
+std::uint16_t paddingValue(int padding, int depth) {
+    const auto v = std::uint32_t(std::clamp(padding, 0, 255));
+    return depth == 16 ? std::uint16_t((v * 32768u + 127u) / 255u) : std::uint16_t(v);
+}
+
+namespace {
+
+template <typename Sample>
+void fillRows(const Image& image, const Area& area, int lo, int hi, int padding, std::uint8_t* base,
+              std::int32_t rowBytes) {
+    const int planes = hi - lo + 1;
+    const Sample constant = Sample(paddingValue(padding, image.depth));
+    for (int y = area.top; y < area.bottom; ++y) {
+        auto* row = reinterpret_cast<Sample*>(base + std::size_t(y - area.top) * std::size_t(rowBytes));
+        const bool rowInside = y >= 0 && y < image.height;
+        const int sy = std::clamp(y, 0, image.height - 1);
+        for (int x = area.left; x < area.right; ++x) {
+            Sample* px = row + std::size_t(x - area.left) * std::size_t(planes);
+            const bool inside = rowInside && x >= 0 && x < image.width;
+            if (inside || padding == kPadReplicate) {
+                const std::uint16_t* src = &image.samples[image.index(std::clamp(x, 0, image.width - 1), sy, lo)];
+                for (int p = 0; p < planes; ++p) px[p] = Sample(src[p]);
+            } else {
+                const Sample v = padding == kPadNone ? Sample(0) : constant;
+                for (int p = 0; p < planes; ++p) px[p] = v;
+            }
+        }
+    }
+}
+
+template <typename Sample>
+void storeRows(Image& image, const Area& area, const Area& clip, int lo, int hi, const std::uint8_t* base,
+               std::int32_t rowBytes) {
+    const int planes = hi - lo + 1;
+    for (int y = clip.top; y < clip.bottom; ++y) {
+        const auto* row = reinterpret_cast<const Sample*>(base + std::size_t(y - area.top) * std::size_t(rowBytes));
+        for (int x = clip.left; x < clip.right; ++x) {
+            const Sample* px = row + std::size_t(x - area.left) * std::size_t(planes);
+            std::uint16_t* dst = &image.samples[image.index(x, y, lo)];
+            for (int p = 0; p < planes; ++p) dst[p] = std::uint16_t(px[p]);
+        }
+    }
+}
+
+}  // namespace
+
+std::string fillArea(const Image& image, const Area& area, int lo, int hi, int padding,
+                     std::vector<std::uint8_t>& buffer, std::int32_t& rowBytes) {
+    if (lo < 0 || hi < lo || hi >= image.channels)
+        return "requested planes " + std::to_string(lo) + ".." + std::to_string(hi) + " outside 0.." +
+               std::to_string(image.channels - 1);
+    if (padding < kPadError || padding > 255) return "invalid padding value " + std::to_string(padding);
+    const Area whole{0, 0, image.height, image.width};
+    if (padding == kPadError && !area.within(whole))
+        return "requested area [" + std::to_string(area.left) + "," + std::to_string(area.top) + " - " +
+               std::to_string(area.right) + "," + std::to_string(area.bottom) +
+               ") leaves the image and the module asked for an error on bounds";
+    const int bytesPerSample = image.depth == 16 ? 2 : 1;
+    rowBytes = paddedRowBytes(area.width(), (hi - lo + 1) * bytesPerSample);
+    const std::size_t total = std::size_t(rowBytes) * std::size_t(area.height());
+    if (total > kMaxAreaBytes) return "requested area of " + std::to_string(total) + " bytes is too large";
+    buffer.assign(total, kRowPaddingFill);
+    if (bytesPerSample == 2)
+        fillRows<std::uint16_t>(image, area, lo, hi, padding, buffer.data(), rowBytes);
+    else
+        fillRows<std::uint8_t>(image, area, lo, hi, padding, buffer.data(), rowBytes);
+    return {};
+}
+
+void storeArea(Image& image, const Area& area, const Area& clip, int lo, int hi, const std::uint8_t* data,
+               std::int32_t rowBytes) {
+    const Area c = clip.intersect(area).intersect(Area{0, 0, image.height, image.width});
+    if (c.empty()) return;
+    if (image.depth == 16)
+        storeRows<std::uint16_t>(image, area, c, lo, hi, data, rowBytes);
+    else
+        storeRows<std::uint8_t>(image, area, c, lo, hi, data, rowBytes);
+}
+
+}  // namespace noctiva::host
