@@ -122,7 +122,7 @@ TEST(Graph, ChangedSourceRectanglesRecomputeEverything) {
     const Case cases[] = {
         {"inner", [](KERNEL::cPixelBlock* b) { b->innerRect.x1 -= 1; }},
         {"outer", [](KERNEL::cPixelBlock* b) { b->outerRect.y1 -= 1; }},
-        {"rowBytes", [](KERNEL::cPixelBlock* b) { b->rowBytes += 12; }},
+        {"sampling", [](KERNEL::cPixelBlock* b) { b->sampling = 2; }},
     };
     for (const auto& tc : cases) {
         SCOPED_TRACE(tc.what);
