@@ -1,0 +1,201 @@
+// Step 3: the tabulated colour examples of modes 1 to 4, copy modes, the pixel walk at sampling 2
+// and inside a partial rectangle, and mode 5's toned grain against the runtime generator.
+#include <gtest/gtest.h>
+
+#include <cstdlib>
+#include <functional>
+#include <iterator>
+
+#include "steps/Step3.h"
+#include "steps/StepTestSupport.h"
+
+using namespace steptest;
+using KERNEL::cRect;
+
+namespace {
+
+class Step3Test : public StepTest {
+protected:
+    cStep3 step{nullptr, &host, nullptr, nullptr};
+
+    // One pixel value through a step, on a small block filled with it.
+    Pixel3 run(cStep3& step, const Pixel3& in) {
+        Image img(3, 2);
+        img.fill(in[0], in[1], in[2]);
+        auto src = img.block();
+        auto dst = runStep(step, src.get());
+        const Pixel3 out = pixelAt(*dst, 2, 1);
+        for (int32_t y = 0; y < 2; ++y)
+            for (int32_t x = 0; x < 3; ++x) EXPECT_EQ(pixelAt(*dst, x, y), out) << "pixels differ";
+        return out;
+    }
+};
+
+constexpr Pixel3 kGrey{32768, 32768, 32768};
+constexpr Pixel3 kBlack{0, 0, 0};
+constexpr Pixel3 kWhite{65535, 65535, 65535};
+constexpr Pixel3 kRamp{10000, 20000, 30000};
+
+// The toning parabola of one channel, as the step defines it (single precision).
+int32_t toning(int64_t amount, int64_t index) {
+    const float x = (float(index) - 512.0f) * 0.001953125f;
+    const float w = 500.0f - x * x * 500.0f;
+    return int32_t(float(amount) * w);
+}
+
+}  // namespace
+
+TEST_F(Step3Test, TabulatedExamples) {
+    struct Case {
+        const char* what;
+        int32_t mode;
+        std::function<void(cStep3&)> set;
+        Pixel3 in, out;
+    };
+    const auto none = [](cStep3&) {};
+    const Case cases[] = {
+        {"grade, grey", 1, none, kGrey, {33549, 32782, 32547}},
+        {"grade 100, grey", 1, [](cStep3& s) { s.gradeMix = 100; }, kGrey, {36676, 32842, 31663}},
+        {"grade, white", 1, none, kWhite, kWhite},
+        {"grade, black", 1, none, kBlack, {45, 0, 0}},
+        {"grade 0", 1, [](cStep3& s) { s.gradeMix = 0; }, kRamp, kRamp},
+        {"warm 200", 2, [](cStep3& s) { s.warmthPercent = 200; }, kGrey, {40448, 33792, 24064}},
+        {"saturation 0", 2, [](cStep3& s) { s.saturationPercent = 0; }, kRamp, {20000, 20000, 20000}},
+        {"saturation 200", 2, [](cStep3& s) { s.saturationPercent = 200; }, kRamp, {0, 20000, 40000}},
+        {"saturation defaults", 2, none, kRamp, kRamp},
+        {"shift 3, grey", 3, none, kGrey, {41968, 37968, 23968}},
+        {"shift 3, black", 3, none, kBlack, {2921, 1651, 0}},
+        {"shift 3, white", 3, none, kWhite, {65535, 65535, 62693}},
+        {"shift 4, grey", 4, none, kGrey, {23568, 27568, 41568}},
+        {"shift 3, strength 0", 3, [](cStep3& s) { s.shiftStrength3 = 0; }, kRamp, kRamp},
+        // Products far beyond 32 bits saturate into the clamp instead of wrapping.
+        {"shift 3, strength max", 3, [](cStep3& s) { s.shiftStrength3 = kMax; }, kGrey, {65535, 65535, 0}},
+        {"shift 4, strength min", 4, [](cStep3& s) { s.shiftStrength4 = kMin; }, kGrey, {65535, 65535, 0}},
+        {"shift 3, level max", 3, [](cStep3& s) { s.shiftLevelB3 = kMax; }, kBlack, {2921, 1651, 65535}},
+        {"saturation max", 2, [](cStep3& s) { s.saturationPercent = kMax; }, kRamp, {0, 20000, 65535}},
+        {"warm min", 2, [](cStep3& s) { s.warmthPercent = kMin; }, kGrey, {0, 0, 65535}},
+        // An unclamped grade that leaves the int range is held at its end.
+        {"grade max", 1, [](cStep3& s) { s.gradeMix = kMax; }, kGrey, {kMax, 1589170666, kMin}},
+        {"grade min, extremes", 1, [](cStep3& s) { s.gradeMix = kMin; }, {kMax, 0, 65535}, {kMax, 0, kMax}},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.what);
+        cStep3 fresh{nullptr, &host, nullptr, nullptr};
+        fresh.mode = c.mode;
+        c.set(fresh);
+        EXPECT_EQ(run(fresh, c.in), c.out);
+    }
+}
+
+TEST_F(Step3Test, OtherModesHandTheInputOn) {
+    for (int32_t mode : {6, -1, 0, 100, kMin, kMax}) {
+        SCOPED_TRACE(mode);
+        step.mode = mode;
+        Image img(9, 7);
+        img.fillRandom(uint32_t(mode));
+        auto src = img.block(cRect{1, 8, 1, 6});
+        auto dst = runStep(step, src.get());
+        expectSamePixels(*src, *dst);
+    }
+}
+
+// At sampling 2 the walk steps two image pixels, i.e. one stored pixel; pixels outside the
+// processing rectangle keep the copied input.
+TEST_F(Step3Test, WalkCoversExactlyTheProcessingRectangle) {
+    step.mode = 3;
+    struct Case {
+        int32_t sampling;
+        cRect inner;
+        int32_t c0, c1, r0, r1;  // stored columns and rows expected to change
+    };
+    const Case cases[] = {{2, {4, 12, 2, 10}, 2, 6, 1, 5}, {1, {3, 9, 2, 5}, 3, 9, 2, 5}, {2, {6, 6, 0, 16}, 0, 0, 0, 0}};
+    for (const Case& c : cases) {
+        SCOPED_TRACE(testing::Message() << "sampling " << c.sampling);
+        Image img(16, 16, 0, 0, c.sampling);
+        img.fill(32768, 32768, 32768);
+        auto src = img.block(c.inner);
+        auto dst = runStep(step, src.get());
+        for (int32_t r = 0; r < img.rows(); ++r)
+            for (int32_t col = 0; col < img.columns(); ++col) {
+                const bool inside = col >= c.c0 && col < c.c1 && r >= c.r0 && r < c.r1;
+                const Pixel3 want = inside ? Pixel3{41968, 37968, 23968} : kGrey;
+                ASSERT_EQ(storedPixel(*dst, col, r), want) << col << "," << r;
+            }
+    }
+}
+
+// Inputs chosen from the draws the step will make, so that sample + grain lands on a chosen value:
+// the middle of the table (its peak), the ends (no toning), one beyond white (clamped).
+TEST_F(Step3Test, GrainLandsOnChosenTableEntries) {
+    struct Target {
+        Pixel3 value, out;
+    };
+    const Target targets[] = {
+        {{32768, 32768, 32768}, {37768, 35268, 27768}},  // peaks 5000, 2500, -5000
+        {{0, 0, 0}, {0, 0, 0}},
+        {{65535, 65535, 65535}, {65535, 65535, 65535}},
+        {{1, 1, 1}, {1, 1, 1}},  // entry 0 is 0
+        {{65600, 70000, 66000}, {65535, 65535, 65535}},
+    };
+    step.mode = 5;  // selector 0, amount 50
+    const unsigned seed = 4242;
+    const int32_t n = int32_t(std::size(targets));
+    Image img(n, 1);
+    std::srand(seed);
+    for (int32_t i = 0; i < n; ++i)
+        for (int k = 0; k < 3; ++k) img.at(i, 0)[k] = targets[i].value[size_t(k)] - std::rand() % 256;
+    std::srand(seed);
+    auto src = img.block();
+    auto dst = runStep(step, src.get());
+    for (int32_t i = 0; i < n; ++i) EXPECT_EQ(pixelAt(*dst, i, 0), targets[i].out) << "target " << i;
+}
+
+// Every toning, and selectors without one, against an evaluation of the rule with the same draws.
+TEST_F(Step3Test, GrainAndToningMatchTheRuleDrawForDraw) {
+    struct Case {
+        int32_t selector;
+        int64_t amount[3];  // with every tone amount 70
+    };
+    const Case cases[] = {{0, {14, 7, -14}},  {1, {14, -16, 18}}, {2, {-14, 16, -18}}, {3, {-14, -7, 14}},
+                          {-1, {0, 0, 0}},    {4, {0, 0, 0}},     {kMin, {0, 0, 0}},   {kMax, {0, 0, 0}}};
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.selector);
+        step.mode = 5;
+        step.toneSelector = c.selector;
+        step.toneAmount0 = step.toneAmount1 = step.toneAmount2 = step.toneAmount3 = 70;
+        Image img(23, 17);
+        img.fillRandom(uint32_t(c.selector) + 1, -300, 65800);
+        img.at(0, 0)[0] = 0;
+        img.at(1, 0)[1] = 65535;
+        img.at(2, 0)[2] = kMax;
+        img.at(3, 0)[0] = kMin;
+        const unsigned seed = 99u + unsigned(c.selector);
+        std::srand(seed);
+        auto src = img.block();
+        auto dst = runStep(step, src.get());
+
+        std::srand(seed);
+        for (int32_t y = 0; y < 17; ++y)
+            for (int32_t x = 0; x < 23; ++x)
+                for (int k = 0; k < 3; ++k) {
+                    int64_t v = int64_t(img.at(x, y)[k]) + std::rand() % 256;
+                    if (v >= 1 && v <= 65534) v += toning(c.amount[k], v >> 6);
+                    const int64_t want = v < 0 ? 0 : (v > 65535 ? 65535 : v);
+                    ASSERT_EQ(pixelAt(*dst, x, y)[k], want) << x << "," << y << "," << k;
+                }
+    }
+}
+
+TEST_F(Step3Test, GrainIsThreeDrawsPerPixelAndNothingElse) {
+    // After a block of N pixels the generator stands 3N draws further on.
+    step.mode = 5;
+    Image img(7, 5);
+    img.fill(30000, 30000, 30000);
+    std::srand(7);
+    auto src = img.block();
+    auto dst = runStep(step, src.get());
+    const int after = std::rand();
+    std::srand(7);
+    for (int i = 0; i < 3 * 7 * 5; ++i) std::rand();
+    EXPECT_EQ(after, std::rand());
+}
