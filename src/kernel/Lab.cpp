@@ -68,9 +68,15 @@ void convertBlock(cPixelBlock* src, cPixelBlock* dst, const KERNEL::cRect& walk,
 }  // namespace
 
 void cRGB2LAB::Process(KERNEL::cPixelBlock* src, KERNEL::cPixelBlock* dst) {
-    convertBlock(src, dst, src->innerRect, src->sampling, KERNEL::lab::toLab);
+    convertBlock(src, dst, src->innerRect, src->sampling,
+                 [](int32_t r, int32_t g, int32_t b, int32_t& L, int32_t& A, int32_t& B) {
+                     KERNEL::lab::toLab(r, g, b, L, A, B);
+                 });
 }
 
 void cLAB2RGB::Process(KERNEL::cPixelBlock* src, KERNEL::cPixelBlock* dst) {
-    convertBlock(src, dst, dst->innerRect, dst->sampling, KERNEL::lab::toRGB);
+    convertBlock(src, dst, dst->innerRect, dst->sampling,
+                 [](int32_t L, int32_t A, int32_t B, int32_t& r, int32_t& g, int32_t& b) {
+                     KERNEL::lab::toRGB(L, A, B, r, g, b);
+                 });
 }
