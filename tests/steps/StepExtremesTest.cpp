@@ -1,0 +1,157 @@
+// Settings the text can carry but the arithmetic of the steps was not made for: every parameter at
+// the ends of the int range, mode by mode, on samples that include the ends of the int range too,
+// and a settings text with every divisor at 0 run through the whole chain.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <iterator>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "kernel/FilterAction.h"
+#include "steps/ShadowChain.h"
+#include "steps/Step1.h"
+#include "steps/Step2.h"
+#include "steps/Step3.h"
+#include "steps/Step4.h"
+#include "steps/StepTestSupport.h"
+
+using namespace steptest;
+using KERNEL::cRect;
+
+namespace {
+
+std::vector<int32_t*> fieldsOf(cStep1& s) {
+    return {&s.medianRadius1, &s.medianRadius2, &s.chromaLimitPercent, &s.edgeStrength, &s.medianRadius4,
+            &s.preset3};
+}
+std::vector<int32_t*> fieldsOf(cStep3& s) {
+    return {&s.gradeMix,       &s.saturationPercent, &s.warmthPercent, &s.shiftStrength3, &s.shiftBase3,
+            &s.shiftLevelR3,   &s.shiftLevelG3,      &s.shiftLevelB3,  &s.shiftStrength4, &s.shiftBase4,
+            &s.shiftLevelR4,   &s.shiftLevelG4,      &s.shiftLevelB4,  &s.toneSelector,   &s.toneAmount0,
+            &s.toneAmount1,    &s.toneAmount2,       &s.toneAmount3};
+}
+std::vector<int32_t*> fieldsOf(cStep4& s) {
+    return {&s.blackLevel1, &s.whiteLevel1, &s.curveStrength2, &s.blackLevel2, &s.whiteLevel2,
+            &s.gradientLevel3, &s.curveStrength3, &s.blackPoint5, &s.whitePoint5, &s.toneRed5,
+            &s.toneBlue5, &s.toneSelector4, &s.liftAmount4, &s.darkenAmount4};
+}
+
+// A picture with ordinary samples and, in its first row, the ends of the int range.
+Image extremePicture(uint32_t seed) {
+    Image img(12, 10, 3, 5);
+    img.fillRandom(seed);
+    const int32_t ends[] = {kMin, kMax, -1, 65536, 0, 65535};
+    for (int32_t i = 0; i < 12; ++i)
+        for (int k = 0; k < 3; ++k) img.at(3 + i, 5)[k] = ends[size_t(i + k) % std::size(ends)];
+    return img;
+}
+
+class StepExtremesTest : public StepTest {
+protected:
+    // Each field alone at `value`, then all of them, for every mode; clampedModes must stay in range.
+    template <class Step>
+    void sweep(const std::vector<int32_t>& modes, const std::vector<int32_t>& clampedModes, int32_t border) {
+        for (int32_t value : {kMin, kMax}) {
+            for (int32_t mode : modes) {
+                Step probe{nullptr, &host, nullptr, nullptr};
+                const size_t count = fieldsOf(probe).size();
+                for (size_t field = 0; field <= count; ++field) {
+                    SCOPED_TRACE(testing::Message() << "mode " << mode << " field " << field << " value " << value);
+                    Step step{nullptr, &host, nullptr, nullptr};
+                    step.mode = mode;
+                    auto fields = fieldsOf(step);
+                    for (size_t i = 0; i < count; ++i)
+                        if (i == field || field == count) *fields[i] = value;
+                    Image img = extremePicture(uint32_t(field + 1));
+                    auto src = img.block(cRect{4, 14, 6, 14});
+                    auto dst = runStep(step, src.get(), border);
+                    if (std::find(clampedModes.begin(), clampedModes.end(), mode) == clampedModes.end()) continue;
+                    for (int32_t r = 0; r < img.rows(); ++r)
+                        for (int32_t c = 0; c < img.columns(); ++c) {
+                            const bool inside = c >= 1 && c < 11 && r >= 1 && r < 9;
+                            if (!inside) continue;
+                            for (int k = 0; k < 3; ++k) {
+                                const int32_t v = storedPixel(*dst, c, r)[size_t(k)];
+                                ASSERT_TRUE(v >= 0 && v <= 65535) << c << "," << r << "," << k << ": " << v;
+                            }
+                        }
+                }
+            }
+        }
+    }
+};
+
+}  // namespace
+
+TEST_F(StepExtremesTest, Step1EveryParameterAtTheEndsOfTheRange) {
+    sweep<cStep1>({1, 2, 3, 4, 5, 100, 102, 105, 108, kMin, kMax}, {}, 10);
+}
+
+TEST_F(StepExtremesTest, Step3EveryParameterAtTheEndsOfTheRange) {
+    sweep<cStep3>({1, 2, 3, 4, 5, 6, -1}, {2, 3, 4, 5}, 0);
+}
+
+TEST_F(StepExtremesTest, Step4EveryParameterAtTheEndsOfTheRange) {
+    for (cRect filter : {cRect{0, 100, 0, 100}, cRect{0, 20, 32766, 32767}, cRect{0, 20, 32767, -32768}}) {
+        SCOPED_TRACE(testing::Message() << "filter rows " << filter.y0 << ".." << filter.y1);
+        host.filterRect = filter;
+        sweep<cStep4>({1, 2, 3, 4, 5, 6, -1}, {1, 2, 3, 4, 5}, 0);
+    }
+}
+
+// Every divisor a settings text can make 0 in step 4 (256 - W - B in modes 1 and 2, 256 minus the
+// gradient level and the rectangle's height in mode 3) at 0: the chain runs to the end, and with
+// the levels left out each mode is the identity, so the result is the bypassed chain's.
+TEST_F(StepExtremesTest, SettingsTextWithZeroDivisorsRunsThroughTheChain) {
+    host.filterRect = {0, 40, 17, 17};
+    auto makeChain = [this](int32_t step4Mode) {
+        auto* s1 = new cStep1(nullptr, &host, nullptr, nullptr);
+        auto* s2 = new cStep2(nullptr, &host, nullptr, nullptr);
+        auto* s3 = new cStep3(nullptr, &host, nullptr, nullptr);
+        auto* s4 = new cStep4(nullptr, &host, nullptr, nullptr);
+        s2->mode = 104;
+        s4->mode = step4Mode;
+        return std::make_pair(std::unique_ptr<cRGB32FilterAction>(buildShadowAction(s1, s2, s3, s4)), s4);
+    };
+    Image in(40, 30);
+    in.fillRandom(8);
+    auto run = [&](cRGB32FilterAction& action) {
+        auto out = std::make_unique<Image>(40, 30);
+        auto src = in.block(in.rect(), cRect{0, 40, 0, 30});
+        auto dst = out->block();
+        action.Apply(src.get(), dst.get());
+        return out;
+    };
+
+    const auto reference = run(*makeChain(0).first);
+
+    for (int32_t mode : {1, 2, 3}) {
+        SCOPED_TRACE(mode);
+        std::string text;
+        {
+            auto [writer, s4] = makeChain(mode);
+            s4->blackLevel1 = 512;
+            s4->whiteLevel1 = 0;
+            s4->blackLevel2 = 256;
+            s4->whiteLevel2 = 256;
+            s4->gradientLevel3 = 256;
+            text = writeShadowParameters(*writer);
+        }
+        auto [action, s4] = makeChain(0);
+        readShadowParameters(*action, text.c_str());
+        ASSERT_EQ(s4->mode, mode);
+        ASSERT_EQ(s4->blackLevel1, 512);
+        ASSERT_EQ(s4->gradientLevel3, 256);
+        const auto out = run(*action);
+        EXPECT_EQ(out->samples, reference->samples);
+        // The rectangle's height is 0 as well; a sound one with the gradient at 256 still divides by 0.
+        if (mode == 3) {
+            host.filterRect = {0, 40, 0, 30};
+            action->InvalidateAndFree();
+            EXPECT_EQ(run(*action)->samples, reference->samples);
+            host.filterRect = {0, 40, 17, 17};
+        }
+    }
+}
