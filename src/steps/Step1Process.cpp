@@ -1,5 +1,5 @@
 // Step 1's variants on Lab: a chroma median held near the input by a limit, and in some modes a
-// smoothing of L across the edges of the 8 x 8 grid followed by a pass that tempers bright specks.
+// smoothing of L across the edges of the 8 x 8 grid followed by a pass that lifts isolated bright L samples.
 #include <cstddef>
 #include <cstdint>
 #include <memory>
