@@ -292,6 +292,9 @@ void Session::Impl::releaseEverything() {
 }
 
 RunResult Session::Impl::run(PluginEntryProc entry) {
+    // The source snapshot is the image as it was before the first run.
+    if (ran_) throw std::logic_error("a session runs once");
+    ran_ = true;
     CurrentSession guard(this);
     entry_ = entry;
     result_ = RunResult{};

@@ -68,8 +68,9 @@ private:
     RunResult result_;
     Area filterArea_;
     PluginEntryProc entry_ = nullptr;
+    bool ran_ = false;
 
-    pi::FilterRecord record_{};
+    alignas(8) pi::FilterRecord record_{};  // pointer fields at 8-aligned offsets stay aligned
     pi::HandleProcs handleProcs_{};
     pi::BufferProcs bufferProcs_{};
     pi::ReadDescriptorProcs readProcs_{};

@@ -84,6 +84,7 @@ public:
     Session(const Session&) = delete;
     Session& operator=(const Session&) = delete;
 
+    // Runs the module once; a session cannot be run again (its source snapshot is spent).
     RunResult run(PluginEntryProc entry);
 
     // The About selector: an about record only, no filter record, no data cell kept.
