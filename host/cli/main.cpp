@@ -53,25 +53,41 @@ std::string readTextFile(const fs::path& path) {
     return text.str();
 }
 
-void writeTextFile(const fs::path& path, const std::string& text) {
-    const fs::path temporary = path.string() + ".tmp";
-    {
-        std::ofstream out(temporary, std::ios::binary | std::ios::trunc);
+// A text file written beside its target and moved into place only on commit, so a failed run
+// leaves neither it nor a half-written file behind.
+class PendingTextFile {
+public:
+    PendingTextFile(const fs::path& target, const std::string& text)
+        : target_(target), temporary_(target.string() + ".tmp") {
+        std::ofstream out(temporary_, std::ios::binary | std::ios::trunc);
         out << text;
         out.close();
         if (!out) {
-            std::error_code ec;
-            fs::remove(temporary, ec);
-            throw HostError(path.string(), "cannot write file");
+            discard();
+            throw HostError(target.string(), "cannot write file");
         }
     }
-    std::error_code ec;
-    fs::rename(temporary, path, ec);
-    if (ec) {
-        fs::remove(temporary, ec);
-        throw HostError(path.string(), "cannot write file");
+    ~PendingTextFile() {
+        if (!committed_) discard();
     }
-}
+    PendingTextFile(const PendingTextFile&) = delete;
+    PendingTextFile& operator=(const PendingTextFile&) = delete;
+
+    void commit() {
+        std::error_code ec;
+        fs::rename(temporary_, target_, ec);
+        if (ec) throw HostError(target_.string(), "cannot write file: " + ec.message());
+        committed_ = true;
+    }
+
+private:
+    void discard() {
+        std::error_code ec;
+        fs::remove(temporary_, ec);
+    }
+    fs::path target_, temporary_;
+    bool committed_ = false;
+};
 
 struct Arguments {
     std::string input, output, module;
@@ -106,8 +122,18 @@ int run(const Arguments& args) {
     if (!result.ok()) throw HostError(args.input, result.message());
     if (result.leaks.any()) std::cerr << "noctiva: warning: the module left " << result.leaks.describe() << "\n";
 
+    std::optional<PendingTextFile> par1Out;
+    if (args.savePar1) par1Out.emplace(*args.savePar1, result.par1Out);
     saveImage(args.output, image, outputFormat, &loaded);
-    if (args.savePar1) writeTextFile(*args.savePar1, result.par1Out);
+    if (par1Out) {
+        try {
+            par1Out->commit();
+        } catch (...) {
+            std::error_code ec;
+            fs::remove(args.output, ec);  // all or nothing
+            throw;
+        }
+    }
     if (!args.quiet)
         std::cout << args.output << ": " << image.width << " x " << image.height << ", " << image.depth << "-bit "
                   << (image.hasAlpha() ? "RGBA" : "RGB") << ", " << result.tilesServed << " tile(s)\n";

@@ -96,6 +96,7 @@ TEST(Command, EveryErrorIsOneLineAndLeavesNoOutput) {
         {in + " -o " + out + " --par1-file " + q(folder / "nofile"), "nofile: cannot read file"},
         {in + " -o " + out + " --module /nonexistent.so", "/nonexistent.so: cannot load module", false},
         {in + " -o " + q(folder / "nodir" / "out.png"), "cannot create file"},
+        {in + " -o " + out + " --save-par1 " + q(folder / "nodir" / "par1.txt"), "par1.txt: cannot write file"},
     };
     for (const Case& c : cases) {
         const Outcome o = runCommand(folder, c.arguments, c.withModule);
