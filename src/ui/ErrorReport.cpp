@@ -1,5 +1,6 @@
 #include "ui/ErrorReport.h"
 
+#include <fstream>
 #include <iostream>
 #include <system_error>
 
@@ -97,6 +98,33 @@ wxWindow* hostWindow(const pi::FilterRecord* record) {
     return window;
 }
 
+// The remembered choice read without the toolkit (which cannot be used before it is started): the
+// store's root entries are "name=value" lines before the first "[group]"; the toolkit writes
+// booleans as 0 and 1. True, the default, when there is no such entry.
+bool storedChoice(const std::string& key) {
+#ifdef __WXMSW__
+    wxConfig store(kApplication, kVendor);
+    return store.ReadBool(wxString::FromUTF8(key.c_str()), true);
+#else
+    std::ifstream in(storePath(kApplication));
+    for (std::string line; std::getline(in, line);) {
+        const size_t first = line.find_first_not_of(" \t");
+        if (first == std::string::npos) continue;
+        if (line[first] == '[') break;
+        const size_t equals = line.find('=', first);
+        if (equals == std::string::npos) continue;
+        std::string name = line.substr(first, equals - first);
+        name.erase(name.find_last_not_of(" \t") + 1);
+        if (name != key) continue;
+        std::string value = line.substr(equals + 1);
+        value.erase(0, value.find_first_not_of(" \t"));
+        value.erase(value.find_last_not_of(" \t\r") + 1);
+        return !(value == "0" || value == "false" || value == "no" || value == "off");
+    }
+    return true;
+#endif
+}
+
 void reportWithoutDisplay() {
     const std::string title = vek::text::wideToUtf8(Translate(kTitleKey));
     const std::string text = vek::text::wideToUtf8(Translate(kCreateLayerText));
@@ -137,6 +165,8 @@ void ReportCreateLayerError(pi::FilterRecord* filterRecord) {
     try {
         const fs::path base = ModuleFolder();
         if (!StartToolkit()) {
+            // A person who turned the warning off does not want it in the log either.
+            if (!storedChoice(kCreateLayerSetting)) return;
             LoadLocalization(base);
             reportWithoutDisplay();
             ReleaseLocalization();
