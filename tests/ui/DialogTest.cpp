@@ -196,4 +196,26 @@ TEST_F(DialogTest, ChoicesUnderTheFormerStoreNameCarryOverOnce) {
     EXPECT_TRUE(again.Get()->ReadBool("ShowErrorCreateLayer", false));
 }
 
+TEST_F(DialogTest, TheReportRunsTwiceInOneProcessAndReleasesTheCatalogue) {
+    ReleaseLocalization();
+    // A handle that names no window: the dialog goes without a parent instead of failing.
+    pi::PlatformData platform{};
+    platform.hwnd = 0x7fffff01;
+    pi::FilterRecord record{};
+    record.platformData = &platform;
+    for (pi::FilterRecord* r : {&record, static_cast<pi::FilterRecord*>(nullptr)}) {
+        wxString title;
+        int kind = -1;
+        endNextDialog(false, wxID_OK, [&](MessageDialog& d) {
+            title = d.GetTitle();
+            kind = d.Kind();
+        });
+        ReportCreateLayerError(r);
+        EXPECT_EQ(title, "Warning");
+        EXPECT_EQ(kind, 1);
+        EXPECT_EQ(TextCatalog::current(), nullptr);
+        EXPECT_EQ(wxConfigBase::Get(false), nullptr);
+    }
+}
+
 }  // namespace
