@@ -5,6 +5,7 @@
 #include "kernel/Node.h"
 #include "kernel/Parameter.h"
 #include "kernel/PixelBlock.h"
+#include "kernel/StageTimer.h"
 
 cFilterAction::cFilterAction() : GUI::cAction(true) {
     // The composite lives inside the action, not on the heap: this reference keeps a node that might
@@ -77,15 +78,20 @@ private:
 
 void cRGB32FilterAction::Apply(KERNEL::cPixelBlock* source, KERNEL::cPixelBlock* destination) {
     if (!enabled || source == nullptr || destination == nullptr) return;
-    std::unique_ptr<KERNEL::cPixelBlock> work(source->convertedTo(KERNEL::kModeRGB32));
-    if (!work) return;
-    work->lock();
-    std::unique_ptr<KERNEL::cPixelBlock> result(work->clone());
-    if (!result) return;
-    result->lock();
+    std::unique_ptr<KERNEL::cPixelBlock> work, result;
+    {
+        KERNEL::timing::cStageClock clock(KERNEL::timing::kConvertIn);
+        work.reset(source->convertedTo(KERNEL::kModeRGB32));
+        if (!work) return;
+        work->lock();
+        result.reset(work->clone());
+        if (!result) return;
+        result->lock();
+    }
     {
         cBorrowedPixels borrowed(sourceBlock, *work);
         result->copyInnerFrom(&composite);
+        KERNEL::timing::cStageClock clock(KERNEL::timing::kConvertOut);
         const KERNEL::cRect inner = result->innerRect;
         KERNEL::cPixelBlock::copyRegion(result.get(), destination, inner.x0, inner.y0, inner.x0, inner.y0, inner);
     }

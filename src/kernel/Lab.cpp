@@ -3,6 +3,7 @@
 #include <cstddef>
 
 #include "kernel/PixelBlock.h"
+#include "kernel/StageTimer.h"
 
 namespace {
 
@@ -68,6 +69,7 @@ void convertBlock(cPixelBlock* src, cPixelBlock* dst, const KERNEL::cRect& walk,
 }  // namespace
 
 void cRGB2LAB::Process(KERNEL::cPixelBlock* src, KERNEL::cPixelBlock* dst) {
+    KERNEL::timing::cStageClock clock(KERNEL::timing::kLab);
     convertBlock(src, dst, src->innerRect, src->sampling,
                  [](int32_t r, int32_t g, int32_t b, int32_t& L, int32_t& A, int32_t& B) {
                      KERNEL::lab::toLab(r, g, b, L, A, B);
@@ -75,6 +77,7 @@ void cRGB2LAB::Process(KERNEL::cPixelBlock* src, KERNEL::cPixelBlock* dst) {
 }
 
 void cLAB2RGB::Process(KERNEL::cPixelBlock* src, KERNEL::cPixelBlock* dst) {
+    KERNEL::timing::cStageClock clock(KERNEL::timing::kLabBack);
     convertBlock(src, dst, dst->innerRect, dst->sampling,
                  [](int32_t L, int32_t A, int32_t B, int32_t& r, int32_t& g, int32_t& b) {
                      KERNEL::lab::toRGB(L, A, B, r, g, b);

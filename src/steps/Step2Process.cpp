@@ -4,6 +4,7 @@
 #include <cstdlib>
 
 #include "kernel/PixelBlock.h"
+#include "kernel/StageTimer.h"
 #include "kernel/ops/Frame.h"
 #include "steps/Step2.h"
 #include "steps/Step2Ops.h"
@@ -127,6 +128,7 @@ void referenceShrink(const cStep2& st, cPixelBlock* src, cPixelBlock* dst) {
 }  // namespace
 
 void cStep2::Process(KERNEL::cPixelBlock* src, KERNEL::cPixelBlock* dst) {
+    KERNEL::timing::cStageClock clock(KERNEL::timing::kStep2);
     // A negative mode is treated like an unknown one: dst becomes a copy of src.
     switch (mode) {
         case 0:
