@@ -12,6 +12,7 @@
 #include "kernel/FilterAction.h"
 #include "kernel/Memory/MEM.h"
 #include "kernel/PixelBlock.h"
+#include "kernel/StageTimer.h"
 #include "plugin/CreateLayerReport.h"
 #include "plugin/PhotoshopPluginHost.h"
 #include "plugin/PluginState.h"
@@ -130,6 +131,7 @@ void cFilter::OnPrepare() {
 }
 
 void cFilter::OnStart() {
+    KERNEL::timing::begin();
     ProcessAllTiles();
     BeginTiles();
     *gResult = pi::noErr;
@@ -146,6 +148,7 @@ void cFilter::OnContinue() {
 }
 
 void cFilter::OnFinish() {
+    KERNEL::timing::finish();
     if (*gResult == pi::noErr) WriteDescriptor();
     delete inputBlock;
     inputBlock = nullptr;
