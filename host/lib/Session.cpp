@@ -278,6 +278,8 @@ void Session::Impl::collectPar1() {
 }
 
 void Session::Impl::releaseEverything() {
+    // The parameter block a module leaves in the record belongs to the host from then on.
+    if (record_.parameters) handles.setHostOwned(record_.parameters);
     LeakReport& leaks = result_.leaks;
     leaks.handles = handles.moduleOwnedCount();
     leaks.handleBytes = handles.moduleOwnedBytes();

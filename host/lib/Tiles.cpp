@@ -30,7 +30,20 @@ void fillRows(const Image& image, const Area& area, int lo, int hi, int padding,
         auto* row = reinterpret_cast<Sample*>(base + std::size_t(y - area.top) * std::size_t(rowBytes));
         const bool rowInside = y >= 0 && y < image.height;
         const int sy = std::clamp(y, 0, image.height - 1);
+        // The part of the row inside the image is one flat run of samples when every plane is
+        // served: a plain converting copy.
+        const int inLeft = std::clamp(area.left, 0, image.width), inRight = std::clamp(area.right, 0, image.width);
+        if (rowInside && planes == image.channels && inLeft < inRight) {
+            const std::uint16_t* __restrict src = &image.samples[image.index(inLeft, sy, 0)];
+            Sample* __restrict dst = row + std::size_t(inLeft - area.left) * std::size_t(planes);
+            const std::size_t n = std::size_t(inRight - inLeft) * std::size_t(planes);
+            for (std::size_t i = 0; i < n; ++i) dst[i] = Sample(src[i]);
+        }
         for (int x = area.left; x < area.right; ++x) {
+            if (rowInside && planes == image.channels && x >= inLeft && x < inRight) {
+                x = inRight - 1;
+                continue;
+            }
             Sample* px = row + std::size_t(x - area.left) * std::size_t(planes);
             const bool inside = rowInside && x >= 0 && x < image.width;
             if (inside || padding == kPadReplicate) {
@@ -50,6 +63,13 @@ void storeRows(Image& image, const Area& area, const Area& clip, int lo, int hi,
     const int planes = hi - lo + 1;
     for (int y = clip.top; y < clip.bottom; ++y) {
         const auto* row = reinterpret_cast<const Sample*>(base + std::size_t(y - area.top) * std::size_t(rowBytes));
+        if (planes == image.channels) {
+            const Sample* __restrict src = row + std::size_t(clip.left - area.left) * std::size_t(planes);
+            std::uint16_t* __restrict dst = &image.samples[image.index(clip.left, y, 0)];
+            const std::size_t n = std::size_t(clip.right - clip.left) * std::size_t(planes);
+            for (std::size_t i = 0; i < n; ++i) dst[i] = std::uint16_t(src[i]);
+            continue;
+        }
         for (int x = clip.left; x < clip.right; ++x) {
             const Sample* px = row + std::size_t(x - area.left) * std::size_t(planes);
             std::uint16_t* dst = &image.samples[image.index(x, y, lo)];

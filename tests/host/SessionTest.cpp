@@ -488,6 +488,17 @@ TEST(Session, LeftoverHandlesAndBuffersAreLeaks) {
     }
 }
 
+TEST(Session, TheParameterBlockPassesToTheHost) {
+    Image image = hosttest::patternImage(2, 2, 3, 8);
+    RunOptions options;
+    options.failOnLeak = true;
+    script() = [&](pi::int16 sel, pi::FilterRecord* r, intptr_t*, pi::int16*) {
+        if (sel == pi::filterSelectorFinish) r->parameters = r->handleProcs->newProc(64);
+    };
+    const RunResult result = runFilter(scriptedEntry, image, options);
+    EXPECT_TRUE(result.ok()) << result.message();
+}
+
 TEST(Session, DescriptorsCarryPar1AndDRes) {
     struct Case {
         const char* written;
