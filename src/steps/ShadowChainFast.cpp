@@ -130,7 +130,7 @@ struct cSource {
 };
 
 template <class S, class D>
-void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorkerPool& pool, std::vector<int32_t>& rows,
+void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorkerPool& pool, int32_t* rows,
              std::vector<std::vector<int32_t>>& lines) {
     cGeometry g{};
     const KERNEL::cRect P = source.outerRect, C = source.innerRect;
@@ -162,7 +162,6 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
 
     const cSource<S> src{source.data, source.rowBytes, source.bytesPerPixel};
     const size_t rowStride = size_t(g.W) * 3;
-    rows.resize(size_t(g.H) * rowStride);
     const bool h1Special = h1.special(h1i0, h1i1), h2Special = h2.special(h2i0, h2i1);
     const bool v1Special = v1.special(v1i0, v1i1), v2Special = v2.special(v2i0, v2i1);
 
@@ -210,7 +209,7 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
                     const int32_t idx = clampIndex(int64_t(q0) + int64_t(j), g.W) - h1i0;
                     std::memcpy(e2 + 3 * j, b1 + 3 * size_t(idx), 3 * sizeof(int32_t));
                 }
-                int32_t* out = rows.data() + size_t(y) * rowStride + 3 * size_t(h2i0);
+                int32_t* out = rows + size_t(y) * rowStride + 3 * size_t(h2i0);
                 boxLine(e2, h2i1 - h2i0, out);
                 if (h2Special) {
                     int32_t s[3] = {0, 0, 0};
@@ -220,7 +219,7 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
                         s[1] += v[1];
                         s[2] += v[2];
                     }
-                    int32_t* last = rows.data() + size_t(y) * rowStride + 3 * size_t(h2.hi - 1);
+                    int32_t* last = rows + size_t(y) * rowStride + 3 * size_t(h2.hi - 1);
                     for (int c = 0; c < 3; ++c) last[c] = boxMean(s[c]);
                 }
             }
@@ -244,7 +243,7 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
             const int32_t x0 = h2i0 + chunk * kColumnChunk;
             const int32_t x1 = std::min(x0 + kColumnChunk, h2i1);
             const size_t n = 3 * size_t(x1 - x0);
-            auto rowAt = [&](int64_t y) { return rows.data() + size_t(clampIndex(y, g.H)) * rowStride + 3 * size_t(x0); };
+            auto rowAt = [&](int64_t y) { return rows + size_t(clampIndex(y, g.H)) * rowStride + 3 * size_t(x0); };
             // First column pass: rows of the row passes -> col.
             std::fill(sums, sums + n, 0);
             for (int32_t k = -kR; k <= kR; ++k) {
@@ -270,6 +269,8 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
                 for (size_t c = 0; c < n; ++c) o[c] = boxMean(sums[c]);
             }
             auto colAt = [&](int64_t y) { return col + K * size_t(clampIndex(y, g.H) - v1i0); };
+            int64_t colMult[kColumnChunk];
+            for (int32_t x = x0; x < x1; ++x) colMult[x - x0] = multiplicity(x, fxMixA, fxMixB, g.W);
             // Second column pass, row by row over the core, straight into the final pixels.
             std::fill(sums, sums + n, 0);
             for (int32_t k = -kR; k <= kR; ++k) {
@@ -295,22 +296,25 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
                 }
                 // Mix: L = (blurred L + 2 x input L) / 3, once per frame position that clamps here.
                 const int64_t rowMult = multiplicity(y, fyMixA, fyMixB, g.H);
-                uint8_t* outRow = destination.data + size_t(y) * destination.rowBytes;
-                for (int32_t x = x0; x < x1; ++x) {
-                    int32_t* t = tmp + 3 * size_t(x - x0);
-                    const S* p = src.at(x, y);
-                    int32_t Ls, as, bs;
-                    KERNEL::lab::toLab(toWork<S>(p[0]), toWork<S>(p[1]), toWork<S>(p[2]), Ls, as, bs);
-                    int32_t L = t[0];
-                    int64_t times = rowMult * multiplicity(x, fxMixA, fxMixB, g.W);
-                    while (times-- > 0) {
+                uint8_t* outRow = destination.data + size_t(y) * destination.rowBytes + size_t(x0) * destination.bytesPerPixel;
+                const uint8_t* inRow = source.data + size_t(y) * source.rowBytes + size_t(x0) * source.bytesPerPixel;
+                const size_t inStep = source.bytesPerPixel, outStep = destination.bytesPerPixel;
+                for (int32_t x = x0; x < x1; ++x, inRow += inStep, outRow += outStep) {
+                    const int32_t* t = tmp + 3 * size_t(x - x0);
+                    const S* p = reinterpret_cast<const S*>(inRow);
+                    const int32_t R0 = toWork<S>(p[0]), G0 = toWork<S>(p[1]), B0 = toWork<S>(p[2]);
+                    // Input L: the Lab formula, which cannot leave 0..65535 for host samples.
+                    const int32_t Ls = ((2 * R0 + 3 * G0 + B0) * 170) >> 10;
+                    int32_t L = (t[0] + 2 * Ls) / 3;
+                    const int64_t times = rowMult * colMult[size_t(x - x0)];
+                    for (int64_t k = 1; k < times; ++k) {
                         const int32_t next = (L + 2 * Ls) / 3;
                         if (next == L) break;
                         L = next;
                     }
                     int32_t R, G, B;
                     toRGB32(L, t[1], t[2], R, G, B);
-                    D* o = reinterpret_cast<D*>(outRow + size_t(x) * destination.bytesPerPixel);
+                    D* o = reinterpret_cast<D*>(outRow);
                     o[0] = fromWork<D>(R);
                     o[1] = fromWork<D>(G);
                     o[2] = fromWork<D>(B);
@@ -337,6 +341,15 @@ bool cDefaultChainTile::Accepts(const cPixelBlock& s, const cPixelBlock& d) {
 
 void cDefaultChainTile::Run(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorkerPool& pool) {
     if (lines.size() < size_t(pool.Threads())) lines.resize(size_t(pool.Threads()));
+    const uint64_t bytes = uint64_t(source.outerRect.width()) * uint64_t(source.outerRect.height()) * 3 * sizeof(int32_t);
+    if (!rowsMemory || rowsMemory->Size() < bytes) {
+        rows = nullptr;
+        rowsMemory.reset();
+        if (bytes > UINT32_MAX) throw KERNEL::cMEMException("could not allocate mem handle", 18, "kernel/Memory");
+        auto memory = std::make_unique<KERNEL::cMEM>(uint32_t(bytes));
+        rows = static_cast<int32_t*>(memory->Lock());
+        rowsMemory = std::move(memory);
+    }
     if (source.bytesPerSample == 1)
         runTile<uint8_t, uint8_t>(source, destination, pool, rows, lines);
     else

@@ -6,7 +6,10 @@
 #pragma once
 
 #include <cstdint>
+#include <memory>
 #include <vector>
+
+#include "kernel/Memory/MEM.h"
 
 namespace KERNEL {
 class cPixelBlock;
@@ -23,6 +26,9 @@ public:
     void Run(const KERNEL::cPixelBlock& source, KERNEL::cPixelBlock& destination, KERNEL::cWorkerPool& pool);
 
 private:
-    std::vector<int32_t> rows;                // the row passes' result, tile-sized
+    // The row passes' result, tile-sized: host buffer memory like every working block, taken at the
+    // first tile and kept locked for the next ones.
+    std::unique_ptr<KERNEL::cMEM> rowsMemory;
+    int32_t* rows = nullptr;
     std::vector<std::vector<int32_t>> lines;  // per-thread lines and column sweeps
 };
