@@ -39,13 +39,6 @@ constexpr pi::Fixed kFixedOne = 1 << 16;
 constexpr pi::Fixed fixed(double v) { return pi::Fixed(v * kFixedOne); }
 
 // The layout of the record passed with the About selector (natural alignment, 272 bytes).
-struct AboutRecord {
-    void* platformData;
-    void* sSPBasic;
-    void* plugInRef;
-    char reserved[244];
-};
-static_assert(sizeof(AboutRecord) == 272);
 
 }  // namespace
 
@@ -335,7 +328,7 @@ RunResult Session::run(PluginEntryProc entry) { return impl_->run(entry); }
 
 pi::OSErr Session::about(PluginEntryProc entry) {
     pi::PlatformData platform{};
-    AboutRecord about{};
+    pi::AboutRecord about{};
     about.platformData = &platform;
     intptr_t data = 0;
     pi::int16 result = pi::noErr;

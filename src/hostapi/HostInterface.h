@@ -202,6 +202,14 @@ struct PlatformData {
     intptr_t hwnd;
 };
 
+// What About receives instead of a FilterRecord.
+struct AboutRecord {
+    void* platformData;
+    void* sSPBasic;
+    void* plugInRef;
+    char reserved[244];
+};
+
 extern "C" {
 using OpenReadDescriptorProc = PIReadDescriptor (*)(Handle descriptor, uint32* keyArray);
 using CloseReadDescriptorProc = OSErr (*)(PIReadDescriptor token);
@@ -528,6 +536,7 @@ static_assert(sizeof(ReadDescriptorProcs) == 152 && offsetof(ReadDescriptorProcs
 static_assert(sizeof(WriteDescriptorProcs) == 136 && offsetof(WriteDescriptorProcs, putTextProc) == 56 &&
               offsetof(WriteDescriptorProcs, putScopedObjectProc) == 128);
 static_assert(sizeof(BigDocumentStruct) == 92);
+static_assert(sizeof(AboutRecord) == 272 && offsetof(AboutRecord, reserved) == 24);
 
 // Suite versions and sizes our host advertises and the module checks.
 constexpr int16 kCurrentHandleProcsVersion = 1;

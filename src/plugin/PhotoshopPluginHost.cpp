@@ -110,7 +110,8 @@ int16_t cPhotoshopPluginHost::RequestArea(const KERNEL::cRect& area, int32_t rat
     gFilterRecord->inHiPlane = gFilterRecord->outHiPlane = int16_t(gFilterRecord->planes - 1);
     gFilterRecord->inputPadding = gFilterRecord->outputPadding = 0;
     gFilterRecord->maskPadding = gFilterRecord->inputPadding;
-    return gFilterRecord->advanceState ? gFilterRecord->advanceState() : pi::errPlugInHostInsufficient;
+    if (!gFilterRecord->advanceState) return pi::errPlugInHostInsufficient;
+    return gFilterRecord->advanceState();
 }
 
 cPhotoshopColorConversion::cPhotoshopColorConversion(int32_t s, int32_t r, KERNEL::cColorTableFactory* factory,

@@ -102,8 +102,8 @@ public:
         u8(uint8_t(s.size()));
         bytes(s);
     }
-    constexpr void padTo4() {
-        while (pos_ % 4 != 0) u8(0);
+    constexpr void zeros(std::size_t n) {
+        for (std::size_t i = 0; i < n; ++i) u8(0);
     }
     constexpr std::size_t size() const { return pos_; }
 
@@ -116,18 +116,19 @@ namespace detail {
 
 constexpr uint32_t kVendor = pi::fourCC("8BIM");
 
-// One property: header, then data padded to four bytes; the stored length is the padded one.
+// One property: header, then its data padded to a multiple of four bytes (the padding counts from the
+// data's start: the header leaves properties at 2 mod 4); the stored length is the padded one.
 template <typename Fill>
 constexpr void property(Writer& w, uint32_t key, Fill&& fill) {
     Writer measure;
     fill(measure);
-    const uint32_t padded = uint32_t((measure.size() + 3) & ~std::size_t(3));
+    const std::size_t padded = (measure.size() + 3) & ~std::size_t(3);
     w.u32(kVendor);
     w.u32(key);
     w.u32(0);
-    w.u32(padded);
+    w.u32(uint32_t(padded));
     fill(w);
-    w.padTo4();
+    w.zeros(padded - measure.size());
 }
 
 constexpr void writePIPL(Writer& w, const Description& d) {

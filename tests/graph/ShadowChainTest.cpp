@@ -139,7 +139,10 @@ TEST(ShadowChain, TableNamesTheFieldsTheTextCarries) {
 TEST(ShadowChain, ReadingBackReproducesEveryField) {
     Shadow a;
     int32_t v = -29;
-    for (int32_t* f : a.fields()) *f = (v += 1237) * ((v & 1) ? -1 : 1);
+    for (int32_t* f : a.fields()) {
+        v += 1237;
+        *f = v * ((v & 1) ? -1 : 1);
+    }
     *a.field(0) = INT32_MIN;
     *a.field(1) = INT32_MAX;
     const std::string text = writeShadowParameters(*a.action);
@@ -170,8 +173,9 @@ TEST(ShadowChain, MissingEntryKeepsItsFieldAndStillConsumesItsNumber) {
     *s.field(12) = -5;
     readShadowParameters(*s.action, text.c_str());
     EXPECT_EQ(*s.field(12), -5);
-    for (int i = 0; i < int(kShadowParameterCount); ++i)
+    for (int i = 0; i < int(kShadowParameterCount); ++i) {
         if (i != 12) EXPECT_EQ(*s.field(i), 1000 + i) << i;
+    }
 }
 
 TEST(ShadowChain, MissingEntryFiveTakesTheDigitAfterParameter5Of50) {

@@ -100,7 +100,9 @@ TEST(Resources, AETESectionDeclaresOneEventWithTheTextParameter) {
     EXPECT_EQ(u16at(p + 9), 0);
     p += 11;
     EXPECT_EQ(aete.size(), p + 6) << "no classes, comparison operators or enumerations follow";
-    EXPECT_EQ(u16at(p), 0), EXPECT_EQ(u16at(p + 2), 0), EXPECT_EQ(u16at(p + 4), 0);
+    EXPECT_EQ(u16at(p), 0);
+    EXPECT_EQ(u16at(p + 2), 0);
+    EXPECT_EQ(u16at(p + 4), 0);
 }
 
 }  // namespace

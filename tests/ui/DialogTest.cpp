@@ -87,7 +87,9 @@ TEST_F(DialogTest, EachKindHasItsButtonsInPanelOrder) {
             EXPECT_EQ(buttons[i]->GetLabel(), c.buttons[i].second) << "kind " << c.kind;
         }
         ASSERT_EQ(dialog.ButtonPanel()->NotAgainBox() != nullptr, c.notAgain) << "kind " << c.kind;
-        if (c.notAgain) EXPECT_EQ(dialog.ButtonPanel()->NotAgainBox()->GetLabel(), "Don't show this message again");
+        if (c.notAgain) {
+            EXPECT_EQ(dialog.ButtonPanel()->NotAgainBox()->GetLabel(), "Don't show this message again");
+        }
         auto* text = dynamic_cast<wxStaticText*>(wxWindow::FindWindowByName("staticText", &dialog));
         ASSERT_NE(text, nullptr);
         EXPECT_EQ(text->GetLabel(), "The message");
