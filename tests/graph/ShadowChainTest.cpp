@@ -168,8 +168,9 @@ std::string entryText(int n, int32_t value) {
 TEST(ShadowChain, MissingEntryKeepsItsFieldAndStillConsumesItsNumber) {
     Shadow s;
     std::string text;
-    for (int i = 0; i < int(kShadowParameterCount); ++i)
+    for (int i = 0; i < int(kShadowParameterCount); ++i) {
         if (i != 12) text += entryText(i, 1000 + i);
+    }
     *s.field(12) = -5;
     readShadowParameters(*s.action, text.c_str());
     EXPECT_EQ(*s.field(12), -5);
