@@ -29,6 +29,13 @@ Module::Module(const std::filesystem::path& path, const std::string& entryName) 
     entry_ = reinterpret_cast<PluginEntryProc>(symbol);
 }
 
+Module Module::load(const std::filesystem::path& path) {
+    ModuleInfo info = readModuleInfo(path);
+    Module module(path, info.entryPoint);
+    module.info_ = std::move(info);
+    return module;
+}
+
 Module::~Module() {
     if (library_) dlclose(library_);
 }
@@ -36,7 +43,8 @@ Module::~Module() {
 Module::Module(Module&& other) noexcept
     : library_(std::exchange(other.library_, nullptr)),
       entry_(std::exchange(other.entry_, nullptr)),
-      path_(std::move(other.path_)) {}
+      path_(std::move(other.path_)),
+      info_(std::exchange(other.info_, std::nullopt)) {}
 
 Module& Module::operator=(Module&& other) noexcept {
     if (this != &other) {
@@ -44,6 +52,7 @@ Module& Module::operator=(Module&& other) noexcept {
         library_ = std::exchange(other.library_, nullptr);
         entry_ = std::exchange(other.entry_, nullptr);
         path_ = std::move(other.path_);
+        info_ = std::exchange(other.info_, std::nullopt);
     }
     return *this;
 }

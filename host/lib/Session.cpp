@@ -4,6 +4,8 @@
 #include <utility>
 
 #include "SessionImpl.h"
+#include "noctiva/host/Module.h"
+#include "noctiva/host/ParentWindow.h"
 
 namespace noctiva::host {
 
@@ -128,7 +130,7 @@ void Session::Impl::setUpRecord() {
     r.autoMask = options_.selection ? 1 : 0;
     r.backColor[0] = r.backColor[1] = r.backColor[2] = 255;
     r.hostSig = pi::fourCC("NCTV");
-    r.imageMode = dest_.depth == 16 ? pi::plugInModeRGB48 : pi::plugInModeRGBColor;
+    r.imageMode = hostImageMode(dest_);
     r.imageHRes = r.imageVRes = pi::Fixed(options_.resolutionDpi) << 16;
     r.floatCoord = {pi::int16(filterArea_.top), pi::int16(filterArea_.left)};
     r.wholeSize = r.imageSize;
@@ -280,6 +282,9 @@ void Session::Impl::releaseEverything() {
     leaks.bufferBytes = buffers.liveBytes();
     leaks.readTokens = tokens.openReads();
     leaks.writeTokens = tokens.openWrites();
+    result_.handleAllocations = handles.allocations;
+    result_.bufferAllocations = buffers.allocations;
+    result_.bufferLocks = buffers.locks;
     handles.releaseAll();
     buffers.releaseAll();
     tokens.clear();
@@ -293,8 +298,13 @@ RunResult Session::Impl::run(PluginEntryProc entry) {
     CurrentSession guard(this);
     entry_ = entry;
     result_ = RunResult{};
+    // Outlives Finish: a dialog may be open on it until the module returns.
+    ParentWindow parent;
     try {
+        if (options_.parentWindow) parent = ParentWindow::open();
         setUpRecord();
+        platformData_.hwnd = parent.id();
+        result_.parentWindow = parent.id();
         setUpDescriptor();
         if (call(pi::filterSelectorPrepare)) {
             if (call(pi::filterSelectorStart)) {
@@ -318,6 +328,9 @@ RunResult Session::Impl::run(PluginEntryProc entry) {
         hostFault("host out of memory", pi::memFullErr);
     }
     releaseEverything();
+    // Tiles already stored by a run that then failed must not pass for a result. The session runs
+    // once, so its source snapshot can go back without a copy (nor an allocation that could fail).
+    if (!result_.ok()) std::swap(dest_.samples, source_.samples);
     return std::move(result_);
 }
 
@@ -326,8 +339,19 @@ Session::~Session() = default;
 
 RunResult Session::run(PluginEntryProc entry) { return impl_->run(entry); }
 
+RunResult Session::run(const Module& module) {
+    if (const ModuleInfo* info = module.info())
+        if (auto refusal = checkImageSupported(*info, impl_->imageMode(), impl_->depth())) throw *refusal;
+    return impl_->run(module.entry());
+}
+
+pi::int16 hostImageMode(const Image& image) {
+    return image.depth == 16 ? pi::plugInModeRGB48 : pi::plugInModeRGBColor;
+}
+
 pi::OSErr Session::about(PluginEntryProc entry) {
-    pi::PlatformData platform{};
+    const ParentWindow parent = ParentWindow::open();
+    pi::PlatformData platform{parent.id()};
     pi::AboutRecord about{};
     about.platformData = &platform;
     intptr_t data = 0;
@@ -339,6 +363,11 @@ pi::OSErr Session::about(PluginEntryProc entry) {
 RunResult runFilter(PluginEntryProc entry, Image& image, const RunOptions& options) {
     Session session(image, options);
     return session.run(entry);
+}
+
+RunResult runFilter(const Module& module, Image& image, const RunOptions& options) {
+    Session session(image, options);
+    return session.run(module);
 }
 
 }  // namespace noctiva::host

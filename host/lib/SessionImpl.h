@@ -34,6 +34,9 @@ public:
     // The session whose run is in progress on this thread, or null.
     static Impl* current();
 
+    pi::int16 imageMode() const { return hostImageMode(dest_); }
+    int depth() const { return dest_.depth; }
+
     // Services for the callbacks.
     pi::OSErr advanceState();
     void progress(std::int32_t done, std::int32_t total);

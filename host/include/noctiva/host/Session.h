@@ -20,6 +20,8 @@
 
 namespace noctiva::host {
 
+class Module;
+
 struct Selection {
     int x = 0, y = 0, width = 0, height = 0;
 };
@@ -29,6 +31,9 @@ struct RunOptions {
     std::optional<std::string> par1;     // scripting text handed in under 'par1'
     std::optional<std::int32_t> dRes;    // integer handed in under 'dRes'
     int resolutionDpi = 72;
+    // With a display, a window of the host's own is the parent of the module's dialogs
+    // (platformData->hwnd) for the run; without one, or when false, hwnd is 0.
+    bool parentWindow = true;
 
     // Fault provocation and checking.
     bool relocateHandles = false;              // move every unlocked handle between entry calls
@@ -67,6 +72,11 @@ struct RunResult {
     long handleMoves = 0;          // relocations performed
     long tilesServed = 0;          // rectangles filled for the module
     long protocolWarnings = 0;     // unknown handles/buffers passed back, double frees
+    std::intptr_t parentWindow = 0;  // the hwnd the module was given (0: none)
+    // What the module asked of the memory suites; the failure switches count the same way.
+    long handleAllocations = 0;
+    long bufferAllocations = 0;
+    long bufferLocks = 0;
 
     bool ok() const { return result == pi::noErr && hostError.empty(); }
     // One line: the module code with its meaning, or the host's finding.
@@ -78,7 +88,8 @@ std::string describeResult(pi::OSErr code);
 
 class Session {
 public:
-    // `image` is the destination: the filter's output is written into it.
+    // `image` is the destination: the filter's output is written into it. A run that does not
+    // end ok leaves it exactly as it was, so nothing half-processed passes for a result.
     Session(Image& image, RunOptions options);
     ~Session();
     Session(const Session&) = delete;
@@ -86,6 +97,9 @@ public:
 
     // Runs the module once; a session cannot be run again (its source snapshot is spent).
     RunResult run(PluginEntryProc entry);
+    // As above, but first refuses an image the module's resources do not accept, without calling
+    // the module: throws HostError(<module name>, "this filter does not support ...").
+    RunResult run(const Module& module);
 
     // The About selector: an about record only, no filter record, no data cell kept.
     static pi::OSErr about(PluginEntryProc entry);
@@ -98,5 +112,9 @@ private:
 
 // Convenience: one Session, one run.
 RunResult runFilter(PluginEntryProc entry, Image& image, const RunOptions& options = {});
+RunResult runFilter(const Module& module, Image& image, const RunOptions& options = {});
+
+// The mode the host serves an image in: RGB for 8 bits, RGB48 for 16.
+pi::int16 hostImageMode(const Image& image);
 
 }  // namespace noctiva::host
