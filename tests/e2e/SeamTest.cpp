@@ -1,0 +1,113 @@
+// The module's tiled result through our host against the same chain evaluated over the whole image
+// as one tile: the 50-pixel margins must hide every tile edge, whatever the stages.
+#include <gtest/gtest.h>
+
+#include <cstring>
+#include <map>
+#include <memory>
+#include <string>
+
+#include "host/TestSupport.h"
+#include "kernel/FilterAction.h"
+#include "kernel/PixelBlock.h"
+#include "noctiva/host/Module.h"
+#include "noctiva/host/Session.h"
+#include "steps/ParameterTable.h"
+#include "steps/ShadowChain.h"
+#include "steps/Step1.h"
+#include "steps/Step2.h"
+#include "steps/Step3.h"
+#include "steps/Step4.h"
+#include "support/MallocHost.h"
+
+using namespace noctiva::host;
+
+namespace {
+
+// The settings text with the defaults, overridden by number.
+std::string settings(const std::map<int, int>& overrides) {
+    std::string text = "vek ";
+    for (const auto& p : shadowParameterTable()) {
+        const auto it = overrides.find(int(p.number));
+        text += " Parameter" + std::to_string(p.number) + " " +
+                std::to_string(it != overrides.end() ? it->second : p.defaultValue) + " ";
+    }
+    return text;
+}
+
+// The whole image as one tile through the kernel: the chain sees the image's edges on every side and
+// no tile edge anywhere.
+Image wholeImageAsOneTile(const Image& in, const std::string& text) {
+    testsupport::MallocHost memory;
+    memory.filterRect = {0, int16_t(in.width), 0, int16_t(in.height)};
+    KERNEL::initModeTables();
+    std::unique_ptr<cRGB32FilterAction> action(buildShadowAction(new cStep1(nullptr, &memory, nullptr, nullptr),
+                                                                 new cStep2(nullptr, &memory, nullptr, nullptr),
+                                                                 new cStep3(nullptr, &memory, nullptr, nullptr),
+                                                                 new cStep4(nullptr, &memory, nullptr, nullptr)));
+    action->ReadParameters(text.c_str() + 4);
+    const uint32_t bytes = in.depth == 16 ? 2 : 1;
+    const uint16_t mode = in.depth == 16 ? KERNEL::kModeRGB16 : KERNEL::kModeRGB;
+    const uint32_t rowBytes = uint32_t(in.width * in.channels) * bytes;
+    std::vector<uint8_t> src(size_t(rowBytes) * size_t(in.height)), dst;
+    for (size_t i = 0; i < in.samples.size(); ++i) {
+        if (bytes == 1) src[i] = uint8_t(in.samples[i]);
+        else std::memcpy(&src[2 * i], &in.samples[i], 2);
+    }
+    dst = src;
+    std::unique_ptr<KERNEL::cPixelBlock> source(KERNEL::cPixelBlock::create(
+        src.data(), in.width, in.height, bytes, uint32_t(in.channels) * bytes, 0, 1, mode, rowBytes, 0, 0));
+    std::unique_ptr<KERNEL::cPixelBlock> destination(KERNEL::cPixelBlock::create(
+        dst.data(), in.width, in.height, bytes, uint32_t(in.channels) * bytes, 0, 1, mode, rowBytes, 0, 0));
+    action->Apply(source.get(), destination.get());
+    action.reset();
+    EXPECT_EQ(memory.liveBuffers(), 0u);
+    Image out = in;
+    for (size_t i = 0; i < out.samples.size(); ++i) {
+        if (bytes == 1) out.samples[i] = dst[i];
+        else std::memcpy(&out.samples[i], &dst[2 * i], 2);
+    }
+    return out;
+}
+
+struct Setting {
+    const char* name;
+    std::map<int, int> overrides;  // parameter number -> value
+};
+std::ostream& operator<<(std::ostream& os, const Setting& s) { return os << s.name; }
+
+class Seams : public ::testing::TestWithParam<Setting> {};
+
+TEST_P(Seams, TiledRunEqualsOneTileOverTheWholeImage) {
+    static const Module module(NOCTIVA_MODULE_PATH);
+    const std::string text = settings(GetParam().overrides);
+    // 613 x 457 is three tiles each way, the last ones of odd size.
+    for (int depth : {8, 16}) {
+        Image tiled = hosttest::patternImage(613, 457, 3, depth, 7);
+        const Image input = tiled;
+        const Image whole = wholeImageAsOneTile(tiled, text);
+        RunOptions options;
+        options.par1 = text;
+        options.failOnLeak = true;
+        const RunResult r = runFilter(module.entry(), tiled, options);
+        ASSERT_TRUE(r.ok()) << r.message();
+        EXPECT_EQ(r.tilesServed, 9) << "three rows of three tiles";
+        size_t differing = 0;
+        for (size_t i = 0; i < whole.samples.size(); ++i) differing += whole.samples[i] != tiled.samples[i];
+        EXPECT_EQ(differing, 0u) << depth << "-bit";
+        EXPECT_NE(tiled, input) << "the stages must have changed the image for the comparison to mean anything";
+    }
+}
+
+// Step 2's modes (number 50) and step 1's grid smoothing (number 57), the widest borders included.
+INSTANTIATE_TEST_SUITE_P(Stages, Seams,
+                         ::testing::Values(Setting{"defaults", {}}, Setting{"blur100", {{50, 100}}},
+                                           Setting{"blur101", {{50, 101}}}, Setting{"chroma107", {{50, 107}}},
+                                           Setting{"wide108", {{50, 108}}}, Setting{"impulse1", {{50, 1}}},
+                                           Setting{"median2", {{50, 2}}}, Setting{"rank3", {{50, 3}}},
+                                           Setting{"blend4", {{50, 4}}}, Setting{"light5", {{50, 5}}},
+                                           Setting{"grid1mode4", {{57, 4}, {50, 104}}},
+                                           Setting{"wavelet105", {{50, 105}}}),
+                         [](const auto& info) { return std::string(info.param.name); });
+
+}  // namespace
