@@ -239,6 +239,7 @@ pi::OSErr Session::Impl::serveRequest() {
     r.maskData = nullptr;
     r.maskRowBytes = 0;
     if (!in.empty() || !out.empty()) ++result_.tilesServed;
+    if (!in.empty()) result_.requestedInRects.push_back(r.inRect);
     return pi::noErr;
 }
 

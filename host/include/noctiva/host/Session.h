@@ -71,6 +71,7 @@ struct RunResult {
     long colorServiceCalls = 0;
     long handleMoves = 0;          // relocations performed
     long tilesServed = 0;          // rectangles filled for the module
+    std::vector<pi::Rect16> requestedInRects;  // every non-empty inRect served, in order
     long protocolWarnings = 0;     // unknown handles/buffers passed back, double frees
     std::intptr_t parentWindow = 0;  // the hwnd the module was given (0: none)
     // What the module asked of the memory suites; the failure switches count the same way.

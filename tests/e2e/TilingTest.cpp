@@ -1,9 +1,11 @@
-// The module's tiled result through our host against the same chain evaluated over the whole image
+// Tiles through our host: the requested rectangles, and the tiled result against the same chain evaluated over the whole image
 // as one tile: the 50-pixel margins must hide every tile edge, whatever the stages.
 #include <gtest/gtest.h>
 
 #include <cstring>
 #include <map>
+#include <optional>
+#include <vector>
 #include <memory>
 #include <string>
 
@@ -109,5 +111,59 @@ INSTANTIATE_TEST_SUITE_P(Stages, Seams,
                                            Setting{"grid1mode4", {{57, 4}, {50, 104}}},
                                            Setting{"wavelet105", {{50, 105}}}),
                          [](const auto& info) { return std::string(info.param.name); });
+
+}  // namespace
+
+namespace {
+
+// Padded ranges along one axis, computed from the tiling rule: a 200-pixel core with 50 pixels of
+// margin towards each neighbour; what remains from a core's start, if at most 250, is the last tile.
+std::vector<std::pair<int, int>> paddedSpans(int start, int extent) {
+    std::vector<std::pair<int, int>> spans;
+    if (extent <= 250) return {{start, start + extent}};
+    int core = start;
+    while (true) {
+        const int pad0 = core == start ? start : core - 50;
+        if (start + extent - core <= 250) {
+            spans.emplace_back(pad0, start + extent);
+            return spans;
+        }
+        spans.emplace_back(pad0, core + 250);
+        core += 200;
+    }
+}
+
+struct Geometry {
+    int width, height;
+    std::optional<Selection> selection;
+};
+
+TEST(Tiles, TheHostIsAskedForExactlyTheTilesRowByRowAndProgressEndsComplete) {
+    static const Module module(NOCTIVA_MODULE_PATH);
+    const std::vector<Geometry> cases = {
+        {251, 37, {}}, {451, 450, {}}, {1031, 777, {}}, {700, 520, Selection{33, 17, 523, 461}}};
+    for (const auto& g : cases) {
+        Image image = hosttest::patternImage(g.width, g.height, 3, 8, 3);
+        RunOptions options;
+        options.selection = g.selection;
+        const RunResult r = runFilter(module.entry(), image, options);
+        ASSERT_TRUE(r.ok()) << r.message();
+        const Selection area = g.selection.value_or(Selection{0, 0, g.width, g.height});
+        std::vector<pi::Rect16> expected;
+        for (const auto& [top, bottom] : paddedSpans(area.y, area.height))
+            for (const auto& [left, right] : paddedSpans(area.x, area.width))
+                expected.push_back({int16_t(top), int16_t(left), int16_t(bottom), int16_t(right)});
+        ASSERT_EQ(r.requestedInRects.size(), expected.size()) << g.width << " x " << g.height;
+        for (size_t i = 0; i < expected.size(); ++i) {
+            const auto& a = r.requestedInRects[i];
+            const auto& e = expected[i];
+            EXPECT_TRUE(a.top == e.top && a.left == e.left && a.bottom == e.bottom && a.right == e.right)
+                << "tile " << i << ": got (" << a.top << "," << a.left << "," << a.bottom << "," << a.right
+                << ") expected (" << e.top << "," << e.left << "," << e.bottom << "," << e.right << ")";
+        }
+        ASSERT_FALSE(r.progress.empty());
+        EXPECT_EQ(r.progress.back().first, r.progress.back().second) << "progress reaches done = total";
+    }
+}
 
 }  // namespace
