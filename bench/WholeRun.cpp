@@ -183,7 +183,7 @@ int main(int argc, char** argv) {
                         t.c_str(), ms, mpix / (ms / 1000.0), *std::min_element(times.begin(), times.end()), tiles);
             if (!stages.empty()) {
                 std::printf("    stages (median ms):");
-                for (const char* name : {"convertIn", "lab", "step2", "labBack", "convertOut", "rows", "columns", "apply"})
+                for (const char* name : {"convertIn", "lab", "step2", "labBack", "convertOut", "rows", "columns", "mix", "apply"})
                     if (stages.count(name)) std::printf(" %s %.1f", name, median(stages[name]));
                 if (stages.count("apply")) std::printf("  host+rest %.1f", ms - median(stages["apply"]));
                 std::printf("\n");

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstring>
+#include <stdexcept>
 
 #include "kernel/Lab.h"
 #include "kernel/PixelBlock.h"
@@ -52,31 +53,19 @@ int64_t multiplicity(int32_t y, int32_t a, int32_t b, int32_t size) {
     return std::max<int64_t>(0, std::min<int64_t>(b, hi) - std::max<int64_t>(a, lo));
 }
 
-inline int32_t boxMean(int32_t sum) {
-    static const float f = 1.0f / float(kN);
-    return int32_t(float(sum) * f);
-}
+constexpr float kBoxScale = 1.0f / float(kN);
+inline int32_t boxMean(int32_t sum) { return int32_t(float(sum) * kBoxScale); }
 
-// Running box along an interleaved line: ext holds positions i0 - kR .. i0 + count - 1 + kR
-// (already clamped), out receives `count` pixels.
-void boxLine(const int32_t* __restrict ext, int32_t count, int32_t* __restrict out) {
-    int32_t s0 = 0, s1 = 0, s2 = 0;
-    for (int32_t k = 0; k < kN; ++k) {
-        s0 += ext[3 * k];
-        s1 += ext[3 * k + 1];
-        s2 += ext[3 * k + 2];
-    }
-    const int32_t* trail = ext;
-    const int32_t* lead = ext + 3 * kN;
-    for (int32_t i = 0; i < count; ++i, trail += 3, lead += 3, out += 3) {
-        out[0] = boxMean(s0);
-        out[1] = boxMean(s1);
-        out[2] = boxMean(s2);
-        if (i + 1 < count) {
-            s0 += lead[0] - trail[0];
-            s1 += lead[1] - trail[1];
-            s2 += lead[2] - trail[2];
-        }
+// Box means along an interleaved 3-channel line: ext holds positions i0 - kR .. i0 + count - 1 + kR
+// (already clamped), out receives `count` pixels. Each sum is taken afresh from its 13 taps: the
+// taps are exact integers, so this equals a running sum, and it has no serial dependency.
+__attribute__((target_clones("avx2", "default"))) void boxLine(const int32_t* __restrict ext, int32_t count,
+                                                               int32_t* __restrict out) {
+    const int32_t n = 3 * count;
+    for (int32_t j = 0; j < n; ++j) {
+        int32_t s = 0;
+        for (int32_t k = 0; k < kN; ++k) s += ext[j + 3 * k];
+        out[j] = boxMean(s);
     }
 }
 
@@ -104,6 +93,13 @@ inline uint16_t fromWork<uint16_t>(int32_t v) {
 
 inline int32_t clamp16(int32_t v) { return v < 0 ? 0 : (v > 65535 ? 65535 : v); }
 
+// Lab of host samples in 32 bits: 6 x 65535 x 170 < 2^27, and L cannot leave 0..65279.
+inline void toLab32(int32_t r, int32_t g, int32_t b, int32_t& L, int32_t& A, int32_t& B) {
+    L = ((2 * r + 3 * g + b) * 170) >> 10;
+    A = ((r - b) >> 1) + 32767;
+    B = ((g - b) >> 1) + 32767;
+}
+
 // Lab back to RGB in 32 bits: on this path L, a and b are box means and mixes of Lab values from
 // host samples, so -1 <= a, b <= 65535 and 0 <= L <= 65535; a x 1365 stays below 2^27 and every sum
 // below 2^18, exactly the 64-bit results.
@@ -114,24 +110,165 @@ inline void toRGB32(int32_t L, int32_t A, int32_t B, int32_t& r, int32_t& g, int
     b = clamp16(L + 54612 - q - B);
 }
 
+// Host pixels [0, n) of one row to the working scale, as Lab or as RGB. CH is the pixel's sample
+// count when known at compile time (3, 4), else 0 and `ch` gives it.
+template <class S, int CH, bool LAB>
+inline void convertSpan(const S* __restrict in, int32_t ch, int32_t n, int32_t* __restrict out) {
+    const int32_t step = CH != 0 ? CH : ch;
+    for (int32_t i = 0; i < n; ++i) {
+        const S* p = in + size_t(i) * size_t(step);
+        const int32_t R = toWork<S>(p[0]), G = toWork<S>(p[1]), B = toWork<S>(p[2]);
+        if constexpr (LAB) {
+            toLab32(R, G, B, out[3 * i], out[3 * i + 1], out[3 * i + 2]);
+        } else {
+            out[3 * i] = R;
+            out[3 * i + 1] = G;
+            out[3 * i + 2] = B;
+        }
+    }
+}
+
+// The mix for `n` pixels of one core row, each taken once: L = (blurred L + 2 x input L) / 3, then
+// Lab back and the host's depth. The alpha sample, if any, is left as it is.
+template <class S, int CH>
+inline void mixSpan(const S* in, const int32_t* __restrict blur, int32_t ch, int32_t n, S* out) {
+    const int32_t step = CH != 0 ? CH : ch;
+    for (int32_t i = 0; i < n; ++i) {
+        const S* p = in + size_t(i) * size_t(step);
+        const int32_t* t = blur + 3 * i;
+        const int32_t R0 = toWork<S>(p[0]), G0 = toWork<S>(p[1]), B0 = toWork<S>(p[2]);
+        const int32_t Ls = ((2 * R0 + 3 * G0 + B0) * 170) >> 10;
+        // Both terms are >= 0: the unsigned division is the signed one and vectorises.
+        const int32_t L = int32_t(uint32_t(t[0] + 2 * Ls) / 3u);
+        int32_t R, G, B;
+        toRGB32(L, t[1], t[2], R, G, B);
+        S* o = out + size_t(i) * size_t(step);
+        o[0] = fromWork<S>(R);
+        o[1] = fromWork<S>(G);
+        o[2] = fromWork<S>(B);
+    }
+}
+
+// One pixel whose frame position is taken `times` times (clamped edges): the mix repeats.
+template <class S>
+inline void mixPixel(const S* p, const int32_t* t, int64_t times, S* o) {
+    const int32_t R0 = toWork<S>(p[0]), G0 = toWork<S>(p[1]), B0 = toWork<S>(p[2]);
+    const int32_t Ls = ((2 * R0 + 3 * G0 + B0) * 170) >> 10;
+    int32_t L = (t[0] + 2 * Ls) / 3;
+    for (int64_t k = 1; k < times; ++k) {
+        const int32_t next = (L + 2 * Ls) / 3;
+        if (next == L) break;
+        L = next;
+    }
+    int32_t R, G, B;
+    toRGB32(L, t[1], t[2], R, G, B);
+    o[0] = fromWork<S>(R);
+    o[1] = fromWork<S>(G);
+    o[2] = fromWork<S>(B);
+}
+
+// Row kernels for one sample type and pixel layout, compiled for AVX2 and for the baseline.
+template <class S, int CH>
+struct cKernels {
+    __attribute__((target_clones("avx2", "default"))) static void convertRgb(const S* in, int32_t ch, int32_t n,
+                                                                           int32_t* out) {
+        convertSpan<S, CH, false>(in, ch, n, out);
+    }
+    __attribute__((target_clones("avx2", "default"))) static void convertLab(const S* in, int32_t ch, int32_t n,
+                                                                           int32_t* out) {
+        convertSpan<S, CH, true>(in, ch, n, out);
+    }
+    __attribute__((target_clones("avx2", "default"))) static void mix(const S* in, const int32_t* blur, int32_t ch,
+                                                                    int32_t n, S* out) {
+        mixSpan<S, CH>(in, blur, ch, n, out);
+    }
+};
+
+// What the column passes need to know about a tile.
+struct cColumns {
+    int32_t* rows;
+    size_t rowStride;
+    int32_t H;
+    int32_t v1i0, v1i1, v2i0, v2i1;
+    const cPass* v1;
+    const cPass* v2;
+    bool v1Special, v2Special;
+};
+
+// Both column passes over the columns [x0, x0 + n / 3) of `rows`; the result replaces those columns
+// of the core rows, which no other chunk reads. NW is n when fixed at compile time, else 0.
+template <size_t NW>
+__attribute__((target_clones("avx2", "default"))) void columnChunk(const cColumns& t, int32_t x0, size_t nRun,
+                                                                   int32_t* scratch) {
+    const size_t n = NW != 0 ? NW : nRun;
+    constexpr size_t K3 = 3 * size_t(kColumnChunk);
+    int32_t* __restrict col = scratch;                                   // first pass, rows v1i0 .. v1i1
+    int32_t* __restrict sums = scratch + K3 * size_t(t.v1i1 - t.v1i0);  // running sums
+    int32_t* const rows = t.rows;
+    auto rowAt = [&](int64_t y) -> const int32_t* {
+        return rows + size_t(clampIndex(y, t.H)) * t.rowStride + 3 * size_t(x0);
+    };
+    auto colAt = [&](int64_t y) -> const int32_t* { return col + K3 * size_t(clampIndex(y, t.H) - t.v1i0); };
+    auto sumAround = [&](auto at, int64_t centre) {
+        for (size_t c = 0; c < n; ++c) sums[c] = 0;
+        for (int32_t k = -kR; k <= kR; ++k) {
+            const int32_t* r = at(centre + k);
+            for (size_t c = 0; c < n; ++c) sums[c] += r[c];
+        }
+    };
+    // First column pass: rows of the row passes -> col.
+    sumAround(rowAt, t.v1i0);
+    for (int32_t i = t.v1i0;; ++i) {
+        int32_t* o = col + K3 * size_t(i - t.v1i0);
+        if (i + 1 == t.v1i1) {
+            for (size_t c = 0; c < n; ++c) o[c] = boxMean(sums[c]);
+            break;
+        }
+        const int32_t* lead = rowAt(int64_t(i) + kR + 1);
+        const int32_t* trail = rowAt(int64_t(i) - kR);
+        for (size_t c = 0; c < n; ++c) {
+            o[c] = boxMean(sums[c]);
+            sums[c] += lead[c] - trail[c];
+        }
+    }
+    if (t.v1Special) {
+        sumAround(rowAt, int64_t(t.v1->b) - 1);
+        int32_t* o = col + K3 * size_t(t.v1->hi - 1 - t.v1i0);
+        for (size_t c = 0; c < n; ++c) o[c] = boxMean(sums[c]);
+    }
+    // Second column pass over the core rows, back into `rows`.
+    const int32_t special = t.v2Special ? t.v2->hi - 1 : -1;
+    sumAround(colAt, t.v2i0);
+    for (int32_t y = t.v2i0; y < t.v2i1; ++y) {
+        int32_t* __restrict o = rows + size_t(y) * t.rowStride + 3 * size_t(x0);
+        if (y == special) {
+            int32_t last[K3];
+            for (size_t c = 0; c < n; ++c) last[c] = 0;
+            for (int32_t k = -kR; k <= kR; ++k) {
+                const int32_t* r = colAt(int64_t(t.v2->b) - 1 + k);
+                for (size_t c = 0; c < n; ++c) last[c] += r[c];
+            }
+            for (size_t c = 0; c < n; ++c) o[c] = boxMean(last[c]);
+        } else {
+            for (size_t c = 0; c < n; ++c) o[c] = boxMean(sums[c]);
+        }
+        if (y + 1 == t.v2i1) break;
+        const int32_t* lead = colAt(int64_t(y) + kR + 1);
+        const int32_t* trail = colAt(int64_t(y) - kR);
+        for (size_t c = 0; c < n; ++c) sums[c] += lead[c] - trail[c];
+    }
+}
+
 struct cGeometry {
     int32_t W, H;       // stored size of the padded tile
     int32_t cx0, cx1, cy0, cy1;  // core, relative to the tile
     int32_t labX0, labX1, labY0, labY1;  // stored indices the Lab conversion covers (inclusive ranges as [0, 1))
 };
 
-template <class S>
-struct cSource {
-    const uint8_t* data;
-    size_t rowBytes, pixelBytes;
-    const S* at(int32_t x, int32_t y) const {
-        return reinterpret_cast<const S*>(data + size_t(y) * rowBytes + size_t(x) * pixelBytes);
-    }
-};
-
-template <class S, class D>
+template <class S, int CH>
 void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorkerPool& pool, int32_t* rows,
              std::vector<std::vector<int32_t>>& lines) {
+    using K = cKernels<S, CH>;
     cGeometry g{};
     const KERNEL::cRect P = source.outerRect, C = source.innerRect;
     g.W = P.x1 - P.x0;
@@ -160,164 +297,124 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
     const int32_t r0 = v1.readFrom(v1i0, v1i1), r1 = v1.readTo(v1i0, v1i1);
     if (h2i0 >= h2i1 || v2i0 >= v2i1 || h1i0 >= h1i1 || v1i0 >= v1i1 || r0 >= r1) return;
 
-    const cSource<S> src{source.data, source.rowBytes, source.bytesPerPixel};
+    const int32_t ch = int32_t(source.bytesPerPixel / sizeof(S));
     const size_t rowStride = size_t(g.W) * 3;
     const bool h1Special = h1.special(h1i0, h1i1), h2Special = h2.special(h2i0, h2i1);
     const bool v1Special = v1.special(v1i0, v1i1), v2Special = v2.special(v2i0, v2i1);
 
     // Rows: host samples -> Lab (RGB outside the Lab stage's area, as the chain holds it there),
-    // then both row passes.
+    // then both row passes. Each line is laid out by position, clamped positions hold copies of
+    // the edge pixel, so the passes run over plain arrays.
     {
         KERNEL::timing::cStageClock clock(KERNEL::timing::kFastRows);
+        // Line 1: positions [p0, p1); its stored part [s0, s1).
+        const int32_t p0 = h1i0 - kR, p1 = h1i1 + kR;
+        const int32_t s0 = std::max(p0, 0), s1 = std::min(p1, g.W);
+        // Line 2: positions [q0, q1); pass 1 writes stored index s at s - q0.
+        const int32_t q0 = h2i0 - kR, q1 = h2i1 + kR;
+        const size_t ext1 = size_t(p1 - p0), ext2 = size_t(std::max(q1, h1i1) - q0);
         pool.parallelFor(r1 - r0, [&](int part, int32_t b, int32_t e) {
             std::vector<int32_t>& buf = lines[size_t(part)];
-            const size_t ext1 = size_t(h1i1 - h1i0 + 2 * kR), box1 = size_t(h1i1 - h1i0),
-                         ext2 = size_t(h2i1 - h2i0 + 2 * kR);
-            buf.resize(3 * (ext1 + box1 + ext2));
+            buf.resize(3 * (ext1 + ext2));
             int32_t* e1 = buf.data();
-            int32_t* b1 = e1 + 3 * ext1;
-            int32_t* e2 = b1 + 3 * box1;
-            auto convert = [&](int32_t x, int32_t y, int32_t* o) {
-                const S* p = src.at(x, y);
-                const int32_t R = toWork<S>(p[0]), G = toWork<S>(p[1]), B = toWork<S>(p[2]);
-                if (y >= g.labY0 && y < g.labY1 && x >= g.labX0 && x < g.labX1) {
-                    KERNEL::lab::toLab(R, G, B, o[0], o[1], o[2]);
-                } else {
-                    o[0] = R;
-                    o[1] = G;
-                    o[2] = B;
-                }
+            int32_t* e2 = e1 + 3 * ext1;
+            auto replicate = [](int32_t* line, int32_t first, int32_t last, int32_t from) {
+                for (int32_t j = first; j < last; ++j) std::memcpy(line + 3 * j, line + 3 * from, 3 * sizeof(int32_t));
             };
             for (int32_t y = r0 + b; y < r0 + e; ++y) {
-                // Gather the converted line with its clamped ends.
-                const int32_t p0 = h1i0 - kR;
-                for (size_t j = 0; j < ext1; ++j) convert(clampIndex(int64_t(p0) + int64_t(j), g.W), y, e1 + 3 * j);
+                const S* in = reinterpret_cast<const S*>(source.data + size_t(y) * source.rowBytes);
+                auto convert = [&](int32_t x0, int32_t x1, bool lab) {
+                    if (x0 >= x1) return;
+                    const S* at = in + size_t(x0) * size_t(ch);
+                    int32_t* out = e1 + 3 * size_t(x0 - p0);
+                    if (lab)
+                        K::convertLab(at, ch, x1 - x0, out);
+                    else
+                        K::convertRgb(at, ch, x1 - x0, out);
+                };
+                if (y >= g.labY0 && y < g.labY1) {
+                    convert(s0, std::min(s1, g.labX0), false);
+                    convert(std::max(s0, g.labX0), std::min(s1, g.labX1), true);
+                    convert(std::max(s0, g.labX1), s1, false);
+                } else {
+                    convert(s0, s1, false);
+                }
+                replicate(e1, 0, s0 - p0, s0 - p0);
+                replicate(e1, s1 - p0, p1 - p0, s1 - 1 - p0);
+
+                int32_t* b1 = e2 + 3 * size_t(h1i0 - q0);
                 boxLine(e1, h1i1 - h1i0, b1);
                 if (h1Special) {
-                    int32_t s[3] = {0, 0, 0}, o[3];
+                    int32_t sum[3] = {0, 0, 0};
                     for (int32_t k = -kR; k <= kR; ++k) {
-                        convert(clampIndex(int64_t(h1.b) - 1 + k, g.W), y, o);
-                        s[0] += o[0];
-                        s[1] += o[1];
-                        s[2] += o[2];
+                        const int32_t* v = e1 + 3 * size_t(clampIndex(int64_t(h1.b) - 1 + k, g.W) - p0);
+                        for (int c = 0; c < 3; ++c) sum[c] += v[c];
                     }
-                    int32_t* last = b1 + 3 * size_t(h1.hi - 1 - h1i0);
-                    for (int c = 0; c < 3; ++c) last[c] = boxMean(s[c]);
+                    for (int c = 0; c < 3; ++c) b1[3 * size_t(h1.hi - 1 - h1i0) + c] = boxMean(sum[c]);
                 }
-                const int32_t q0 = h2i0 - kR;
-                for (size_t j = 0; j < ext2; ++j) {
-                    const int32_t idx = clampIndex(int64_t(q0) + int64_t(j), g.W) - h1i0;
-                    std::memcpy(e2 + 3 * j, b1 + 3 * size_t(idx), 3 * sizeof(int32_t));
-                }
-                int32_t* out = rows + size_t(y) * rowStride + 3 * size_t(h2i0);
-                boxLine(e2, h2i1 - h2i0, out);
+                // Line 2's clamped positions: stored 0 before, stored W - 1 after.
+                replicate(e2, 0, std::max(0, -q0), -q0);
+                replicate(e2, std::max(0, g.W - q0), q1 - q0, g.W - 1 - q0);
+
+                int32_t* out = rows + size_t(y) * rowStride;
+                boxLine(e2, h2i1 - h2i0, out + 3 * size_t(h2i0));
                 if (h2Special) {
-                    int32_t s[3] = {0, 0, 0};
+                    int32_t sum[3] = {0, 0, 0};
                     for (int32_t k = -kR; k <= kR; ++k) {
-                        const int32_t* v = b1 + 3 * size_t(clampIndex(int64_t(h2.b) - 1 + k, g.W) - h1i0);
-                        s[0] += v[0];
-                        s[1] += v[1];
-                        s[2] += v[2];
+                        const int32_t* v = e2 + 3 * size_t(clampIndex(int64_t(h2.b) - 1 + k, g.W) - q0);
+                        for (int c = 0; c < 3; ++c) sum[c] += v[c];
                     }
-                    int32_t* last = rows + size_t(y) * rowStride + 3 * size_t(h2.hi - 1);
-                    for (int c = 0; c < 3; ++c) last[c] = boxMean(s[c]);
+                    for (int c = 0; c < 3; ++c) out[3 * size_t(h2.hi - 1) + c] = boxMean(sum[c]);
                 }
             }
         });
     }
 
-    // Columns, in chunks: both column passes, the luminance mix, Lab back and the host's depth.
-    KERNEL::timing::cStageClock clock(KERNEL::timing::kFastColumns);
-    const int32_t columns = h2i1 - h2i0;
-    const int32_t chunks = (columns + kColumnChunk - 1) / kColumnChunk;
-    const int32_t fxMixA = fx0, fxMixB = fx1, fyMixA = fy0, fyMixB = fy1;
-    pool.parallelFor(chunks, [&](int part, int32_t b, int32_t e) {
-        std::vector<int32_t>& buf = lines[size_t(part)];
-        const size_t K = 3 * size_t(kColumnChunk);
-        const size_t v1Rows = size_t(v1i1 - v1i0);
-        buf.resize(K * (v1Rows + 2 + size_t(kColumnChunk)));
-        int32_t* col = buf.data();             // first pass, rows v1i0 .. v1i1
-        int32_t* sums = col + K * v1Rows;      // running sums
-        int32_t* tmp = sums + K;               // one output row
-        for (int32_t chunk = b; chunk < e; ++chunk) {
-            const int32_t x0 = h2i0 + chunk * kColumnChunk;
-            const int32_t x1 = std::min(x0 + kColumnChunk, h2i1);
-            const size_t n = 3 * size_t(x1 - x0);
-            auto rowAt = [&](int64_t y) { return rows + size_t(clampIndex(y, g.H)) * rowStride + 3 * size_t(x0); };
-            // First column pass: rows of the row passes -> col.
-            std::fill(sums, sums + n, 0);
-            for (int32_t k = -kR; k <= kR; ++k) {
-                const int32_t* r = rowAt(int64_t(v1i0) + k);
-                for (size_t c = 0; c < n; ++c) sums[c] += r[c];
+    // Columns, in chunks: both column passes; the result replaces the chunk's own columns of the
+    // core rows in `rows`, which no other chunk reads.
+    {
+        KERNEL::timing::cStageClock clock(KERNEL::timing::kFastColumns);
+        const int32_t columns = h2i1 - h2i0;
+        const int32_t chunks = (columns + kColumnChunk - 1) / kColumnChunk;
+        const cColumns cv{rows, rowStride, g.H, v1i0, v1i1, v2i0, v2i1, &v1, &v2, v1Special, v2Special};
+        pool.parallelFor(chunks, [&](int part, int32_t b, int32_t e) {
+            std::vector<int32_t>& buf = lines[size_t(part)];
+            buf.resize(3 * size_t(kColumnChunk) * size_t(v1i1 - v1i0 + 1));
+            for (int32_t chunk = b; chunk < e; ++chunk) {
+                const int32_t x0 = h2i0 + chunk * kColumnChunk;
+                const int32_t x1 = std::min(x0 + kColumnChunk, h2i1);
+                if (x1 - x0 == kColumnChunk)
+                    columnChunk<3 * kColumnChunk>(cv, x0, 0, buf.data());
+                else
+                    columnChunk<0>(cv, x0, 3 * size_t(x1 - x0), buf.data());
             }
-            for (int32_t i = v1i0; i < v1i1; ++i) {
-                int32_t* o = col + K * size_t(i - v1i0);
-                for (size_t c = 0; c < n; ++c) o[c] = boxMean(sums[c]);
-                if (i + 1 < v1i1) {
-                    const int32_t* lead = rowAt(int64_t(i) + kR + 1);
-                    const int32_t* trail = rowAt(int64_t(i) - kR);
-                    for (size_t c = 0; c < n; ++c) sums[c] += lead[c] - trail[c];
-                }
-            }
-            if (v1Special) {
-                std::fill(sums, sums + n, 0);
-                for (int32_t k = -kR; k <= kR; ++k) {
-                    const int32_t* r = rowAt(int64_t(v1.b) - 1 + k);
-                    for (size_t c = 0; c < n; ++c) sums[c] += r[c];
-                }
-                int32_t* o = col + K * size_t(v1.hi - 1 - v1i0);
-                for (size_t c = 0; c < n; ++c) o[c] = boxMean(sums[c]);
-            }
-            auto colAt = [&](int64_t y) { return col + K * size_t(clampIndex(y, g.H) - v1i0); };
-            int64_t colMult[kColumnChunk];
-            for (int32_t x = x0; x < x1; ++x) colMult[x - x0] = multiplicity(x, fxMixA, fxMixB, g.W);
-            // Second column pass, row by row over the core, straight into the final pixels.
-            std::fill(sums, sums + n, 0);
-            for (int32_t k = -kR; k <= kR; ++k) {
-                const int32_t* r = colAt(int64_t(v2i0) + k);
-                for (size_t c = 0; c < n; ++c) sums[c] += r[c];
-            }
-            for (int32_t y = v2i0; y < v2i1; ++y) {
-                const bool last = v2Special && y == v2.hi - 1;
-                if (last) {
-                    std::fill(tmp, tmp + n, 0);
-                    for (int32_t k = -kR; k <= kR; ++k) {
-                        const int32_t* r = colAt(int64_t(v2.b) - 1 + k);
-                        for (size_t c = 0; c < n; ++c) tmp[c] += r[c];
-                    }
-                    for (size_t c = 0; c < n; ++c) tmp[c] = boxMean(tmp[c]);
-                } else {
-                    for (size_t c = 0; c < n; ++c) tmp[c] = boxMean(sums[c]);
-                }
-                if (y + 1 < v2i1) {
-                    const int32_t* lead = colAt(int64_t(y) + kR + 1);
-                    const int32_t* trail = colAt(int64_t(y) - kR);
-                    for (size_t c = 0; c < n; ++c) sums[c] += lead[c] - trail[c];
-                }
-                // Mix: L = (blurred L + 2 x input L) / 3, once per frame position that clamps here.
-                const int64_t rowMult = multiplicity(y, fyMixA, fyMixB, g.H);
-                uint8_t* outRow = destination.data + size_t(y) * destination.rowBytes + size_t(x0) * destination.bytesPerPixel;
-                const uint8_t* inRow = source.data + size_t(y) * source.rowBytes + size_t(x0) * source.bytesPerPixel;
-                const size_t inStep = source.bytesPerPixel, outStep = destination.bytesPerPixel;
-                for (int32_t x = x0; x < x1; ++x, inRow += inStep, outRow += outStep) {
-                    const int32_t* t = tmp + 3 * size_t(x - x0);
-                    const S* p = reinterpret_cast<const S*>(inRow);
-                    const int32_t R0 = toWork<S>(p[0]), G0 = toWork<S>(p[1]), B0 = toWork<S>(p[2]);
-                    // Input L: the Lab formula, which cannot leave 0..65535 for host samples.
-                    const int32_t Ls = ((2 * R0 + 3 * G0 + B0) * 170) >> 10;
-                    int32_t L = (t[0] + 2 * Ls) / 3;
-                    const int64_t times = rowMult * colMult[size_t(x - x0)];
-                    for (int64_t k = 1; k < times; ++k) {
-                        const int32_t next = (L + 2 * Ls) / 3;
-                        if (next == L) break;
-                        L = next;
-                    }
-                    int32_t R, G, B;
-                    toRGB32(L, t[1], t[2], R, G, B);
-                    D* o = reinterpret_cast<D*>(outRow);
-                    o[0] = fromWork<D>(R);
-                    o[1] = fromWork<D>(G);
-                    o[2] = fromWork<D>(B);
+        });
+    }
+
+    // Mix, Lab back and the host's depth over whole core rows. A frame position clamped onto a
+    // stored edge pixel is mixed once per position: those few pixels are redone afterwards.
+    KERNEL::timing::cStageClock clock(KERNEL::timing::kFastMix);
+    const int64_t colMultFirst = multiplicity(h2i0, fx0, fx1, g.W), colMultLast = multiplicity(h2i1 - 1, fx0, fx1, g.W);
+    pool.parallelFor(v2i1 - v2i0, [&](int, int32_t b, int32_t e) {
+        for (int32_t y = v2i0 + b; y < v2i0 + e; ++y) {
+            const S* in = reinterpret_cast<const S*>(source.data + size_t(y) * source.rowBytes) + size_t(h2i0) * size_t(ch);
+            S* out = reinterpret_cast<S*>(destination.data + size_t(y) * destination.rowBytes) + size_t(h2i0) * size_t(ch);
+            const int32_t* blur = rows + size_t(y) * rowStride + 3 * size_t(h2i0);
+            const int32_t n = h2i1 - h2i0;
+            const int64_t rowMult = multiplicity(y, fy0, fy1, g.H);
+            if (rowMult == 1) {
+                // Edge pixels with another multiplicity go through the scalar mix, never both (the
+                // source and destination may be one buffer).
+                const int32_t a = colMultFirst != 1 ? 1 : 0, z = n > 1 && colMultLast != 1 ? n - 1 : n;
+                if (z > a) K::mix(in + size_t(a) * size_t(ch), blur + 3 * size_t(a), ch, z - a, out + size_t(a) * size_t(ch));
+                if (a == 1) mixPixel<S>(in, blur, colMultFirst, out);
+                if (z == n - 1)
+                    mixPixel<S>(in + size_t(z) * size_t(ch), blur + 3 * size_t(z), colMultLast, out + size_t(z) * size_t(ch));
+            } else {
+                for (int32_t x = h2i0; x < h2i1; ++x) {
+                    const size_t i = size_t(x - h2i0);
+                    mixPixel<S>(in + i * size_t(ch), blur + 3 * i, rowMult * multiplicity(x, fx0, fx1, g.W),
+                                out + i * size_t(ch));
                 }
             }
         }
@@ -350,8 +447,24 @@ void cDefaultChainTile::Run(const cPixelBlock& source, cPixelBlock& destination,
         rows = static_cast<int32_t*>(memory->Lock());
         rowsMemory = std::move(memory);
     }
-    if (source.bytesPerSample == 1)
-        runTile<uint8_t, uint8_t>(source, destination, pool, rows, lines);
-    else
-        runTile<uint16_t, uint16_t>(source, destination, pool, rows, lines);
+    const size_t channels = source.bytesPerPixel / source.bytesPerSample;
+    const bool whole = source.bytesPerPixel % source.bytesPerSample == 0 && source.rowBytes % source.bytesPerSample == 0 &&
+                       destination.bytesPerPixel == source.bytesPerPixel &&
+                       destination.rowBytes % destination.bytesPerSample == 0;
+    if (!whole) throw std::logic_error("default chain tile: pixel layout not in whole samples");
+    if (source.bytesPerSample == 1) {
+        if (channels == 3)
+            runTile<uint8_t, 3>(source, destination, pool, rows, lines);
+        else if (channels == 4)
+            runTile<uint8_t, 4>(source, destination, pool, rows, lines);
+        else
+            runTile<uint8_t, 0>(source, destination, pool, rows, lines);
+    } else {
+        if (channels == 3)
+            runTile<uint16_t, 3>(source, destination, pool, rows, lines);
+        else if (channels == 4)
+            runTile<uint16_t, 4>(source, destination, pool, rows, lines);
+        else
+            runTile<uint16_t, 0>(source, destination, pool, rows, lines);
+    }
 }
