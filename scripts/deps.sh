@@ -7,6 +7,7 @@ packages=(
   libboost-dev librapidxml-dev libexpat1-dev libwxgtk3.2-dev
   libpng-dev libtiff-dev libcli11-dev
   xvfb xauth xdotool imagemagick binutils
+  gimp libgimp2.0-dev libgtk-3-dev
 )
 missing=()
 for p in "${packages[@]}"; do
