@@ -82,7 +82,7 @@ std::optional<Choice> runDialog(const Choice& initial) {
     gtk_grid_attach(GTK_GRID(grid), GTK_WIDGET(w.summary), 1, 1, 1, 1);
 
     GtkWidget* textView = gtk_text_view_new();
-    gtk_text_view_set_wrap_mode(GTK_TEXT_VIEW(textView), GTK_WRAP_CHAR);
+    gtk_text_view_set_wrap_mode(GTK_TEXT_VIEW(textView), GTK_WRAP_WORD_CHAR);
     gtk_text_view_set_monospace(GTK_TEXT_VIEW(textView), TRUE);
     w.text = gtk_text_view_get_buffer(GTK_TEXT_VIEW(textView));
     GtkWidget* scrolled = gtk_scrolled_window_new(nullptr, nullptr);
