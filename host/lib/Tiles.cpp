@@ -26,8 +26,10 @@ void fillRows(const Image& image, const Area& area, int lo, int hi, int padding,
               std::int32_t rowBytes) {
     const int planes = hi - lo + 1;
     const Sample constant = Sample(paddingValue(padding, image.depth));
+    const std::size_t tight = std::size_t(area.width()) * std::size_t(planes) * sizeof(Sample);
     for (int y = area.top; y < area.bottom; ++y) {
         auto* row = reinterpret_cast<Sample*>(base + std::size_t(y - area.top) * std::size_t(rowBytes));
+        std::memset(reinterpret_cast<std::uint8_t*>(row) + tight, kRowPaddingFill, std::size_t(rowBytes) - tight);
         const bool rowInside = y >= 0 && y < image.height;
         const int sy = std::clamp(y, 0, image.height - 1);
         // The part of the row inside the image is one flat run of samples when every plane is
@@ -95,7 +97,9 @@ std::string fillArea(const Image& image, const Area& area, int lo, int hi, int p
     rowBytes = paddedRowBytes(area.width(), (hi - lo + 1) * bytesPerSample);
     const std::size_t total = std::size_t(rowBytes) * std::size_t(area.height());
     if (total > kMaxAreaBytes) return "requested area of " + std::to_string(total) + " bytes is too large";
-    buffer.assign(total, kRowPaddingFill);
+    // Every sample of the area is written below and each row's padding gets the fill there, so the
+    // buffer kept from the last tile is not filled twice.
+    buffer.resize(total);
     if (bytesPerSample == 2)
         fillRows<std::uint16_t>(image, area, lo, hi, padding, buffer.data(), rowBytes);
     else

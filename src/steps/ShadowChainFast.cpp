@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstring>
+#include <optional>
 #include <stdexcept>
 
 #include "kernel/Lab.h"
@@ -305,97 +306,90 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
     // Rows: host samples -> Lab (RGB outside the Lab stage's area, as the chain holds it there),
     // then both row passes. Each line is laid out by position, clamped positions hold copies of
     // the edge pixel, so the passes run over plain arrays.
-    {
-        KERNEL::timing::cStageClock clock(KERNEL::timing::kFastRows);
-        // Line 1: positions [p0, p1); its stored part [s0, s1).
-        const int32_t p0 = h1i0 - kR, p1 = h1i1 + kR;
-        const int32_t s0 = std::max(p0, 0), s1 = std::min(p1, g.W);
-        // Line 2: positions [q0, q1); pass 1 writes stored index s at s - q0.
-        const int32_t q0 = h2i0 - kR, q1 = h2i1 + kR;
-        const size_t ext1 = size_t(p1 - p0), ext2 = size_t(std::max(q1, h1i1) - q0);
-        pool.parallelFor(r1 - r0, [&](int part, int32_t b, int32_t e) {
-            std::vector<int32_t>& buf = lines[size_t(part)];
-            buf.resize(3 * (ext1 + ext2));
-            int32_t* e1 = buf.data();
-            int32_t* e2 = e1 + 3 * ext1;
-            auto replicate = [](int32_t* line, int32_t first, int32_t last, int32_t from) {
-                for (int32_t j = first; j < last; ++j) std::memcpy(line + 3 * j, line + 3 * from, 3 * sizeof(int32_t));
+    // Line 1: positions [p0, p1); its stored part [s0, s1).
+    const int32_t p0 = h1i0 - kR, p1 = h1i1 + kR;
+    const int32_t s0 = std::max(p0, 0), s1 = std::min(p1, g.W);
+    // Line 2: positions [q0, q1); pass 1 writes stored index s at s - q0.
+    const int32_t q0 = h2i0 - kR, q1 = h2i1 + kR;
+    const size_t ext1 = size_t(p1 - p0), ext2 = size_t(std::max(q1, h1i1) - q0);
+    auto rowsPart = [&](int part, int32_t b, int32_t e) {
+        std::vector<int32_t>& buf = lines[size_t(part)];
+        buf.resize(3 * (ext1 + ext2));
+        int32_t* e1 = buf.data();
+        int32_t* e2 = e1 + 3 * ext1;
+        auto replicate = [](int32_t* line, int32_t first, int32_t last, int32_t from) {
+            for (int32_t j = first; j < last; ++j) std::memcpy(line + 3 * j, line + 3 * from, 3 * sizeof(int32_t));
+        };
+        for (int32_t y = r0 + b; y < r0 + e; ++y) {
+            const S* in = reinterpret_cast<const S*>(source.data + size_t(y) * source.rowBytes);
+            auto convert = [&](int32_t x0, int32_t x1, bool lab) {
+                if (x0 >= x1) return;
+                const S* at = in + size_t(x0) * size_t(ch);
+                int32_t* out = e1 + 3 * size_t(x0 - p0);
+                if (lab)
+                    K::convertLab(at, ch, x1 - x0, out);
+                else
+                    K::convertRgb(at, ch, x1 - x0, out);
             };
-            for (int32_t y = r0 + b; y < r0 + e; ++y) {
-                const S* in = reinterpret_cast<const S*>(source.data + size_t(y) * source.rowBytes);
-                auto convert = [&](int32_t x0, int32_t x1, bool lab) {
-                    if (x0 >= x1) return;
-                    const S* at = in + size_t(x0) * size_t(ch);
-                    int32_t* out = e1 + 3 * size_t(x0 - p0);
-                    if (lab)
-                        K::convertLab(at, ch, x1 - x0, out);
-                    else
-                        K::convertRgb(at, ch, x1 - x0, out);
-                };
-                if (y >= g.labY0 && y < g.labY1) {
-                    convert(s0, std::min(s1, g.labX0), false);
-                    convert(std::max(s0, g.labX0), std::min(s1, g.labX1), true);
-                    convert(std::max(s0, g.labX1), s1, false);
-                } else {
-                    convert(s0, s1, false);
-                }
-                replicate(e1, 0, s0 - p0, s0 - p0);
-                replicate(e1, s1 - p0, p1 - p0, s1 - 1 - p0);
-
-                int32_t* b1 = e2 + 3 * size_t(h1i0 - q0);
-                boxLine(e1, h1i1 - h1i0, b1);
-                if (h1Special) {
-                    int32_t sum[3] = {0, 0, 0};
-                    for (int32_t k = -kR; k <= kR; ++k) {
-                        const int32_t* v = e1 + 3 * size_t(clampIndex(int64_t(h1.b) - 1 + k, g.W) - p0);
-                        for (int c = 0; c < 3; ++c) sum[c] += v[c];
-                    }
-                    for (int c = 0; c < 3; ++c) b1[3 * size_t(h1.hi - 1 - h1i0) + c] = boxMean(sum[c]);
-                }
-                // Line 2's clamped positions: stored 0 before, stored W - 1 after.
-                replicate(e2, 0, std::max(0, -q0), -q0);
-                replicate(e2, std::max(0, g.W - q0), q1 - q0, g.W - 1 - q0);
-
-                int32_t* out = rows + size_t(y) * rowStride;
-                boxLine(e2, h2i1 - h2i0, out + 3 * size_t(h2i0));
-                if (h2Special) {
-                    int32_t sum[3] = {0, 0, 0};
-                    for (int32_t k = -kR; k <= kR; ++k) {
-                        const int32_t* v = e2 + 3 * size_t(clampIndex(int64_t(h2.b) - 1 + k, g.W) - q0);
-                        for (int c = 0; c < 3; ++c) sum[c] += v[c];
-                    }
-                    for (int c = 0; c < 3; ++c) out[3 * size_t(h2.hi - 1) + c] = boxMean(sum[c]);
-                }
+            if (y >= g.labY0 && y < g.labY1) {
+                convert(s0, std::min(s1, g.labX0), false);
+                convert(std::max(s0, g.labX0), std::min(s1, g.labX1), true);
+                convert(std::max(s0, g.labX1), s1, false);
+            } else {
+                convert(s0, s1, false);
             }
-        });
-    }
+            replicate(e1, 0, s0 - p0, s0 - p0);
+            replicate(e1, s1 - p0, p1 - p0, s1 - 1 - p0);
+
+            int32_t* b1 = e2 + 3 * size_t(h1i0 - q0);
+            boxLine(e1, h1i1 - h1i0, b1);
+            if (h1Special) {
+                int32_t sum[3] = {0, 0, 0};
+                for (int32_t k = -kR; k <= kR; ++k) {
+                    const int32_t* v = e1 + 3 * size_t(clampIndex(int64_t(h1.b) - 1 + k, g.W) - p0);
+                    for (int c = 0; c < 3; ++c) sum[c] += v[c];
+                }
+                for (int c = 0; c < 3; ++c) b1[3 * size_t(h1.hi - 1 - h1i0) + c] = boxMean(sum[c]);
+            }
+            // Line 2's clamped positions: stored 0 before, stored W - 1 after.
+            replicate(e2, 0, std::max(0, -q0), -q0);
+            replicate(e2, std::max(0, g.W - q0), q1 - q0, g.W - 1 - q0);
+
+            int32_t* out = rows + size_t(y) * rowStride;
+            boxLine(e2, h2i1 - h2i0, out + 3 * size_t(h2i0));
+            if (h2Special) {
+                int32_t sum[3] = {0, 0, 0};
+                for (int32_t k = -kR; k <= kR; ++k) {
+                    const int32_t* v = e2 + 3 * size_t(clampIndex(int64_t(h2.b) - 1 + k, g.W) - q0);
+                    for (int c = 0; c < 3; ++c) sum[c] += v[c];
+                }
+                for (int c = 0; c < 3; ++c) out[3 * size_t(h2.hi - 1) + c] = boxMean(sum[c]);
+            }
+        }
+    };
 
     // Columns, in chunks: both column passes; the result replaces the chunk's own columns of the
     // core rows in `rows`, which no other chunk reads.
-    {
-        KERNEL::timing::cStageClock clock(KERNEL::timing::kFastColumns);
-        const int32_t columns = h2i1 - h2i0;
-        const int32_t chunks = (columns + kColumnChunk - 1) / kColumnChunk;
-        const cColumns cv{rows, rowStride, g.H, v1i0, v1i1, v2i0, v2i1, &v1, &v2, v1Special, v2Special};
-        pool.parallelFor(chunks, [&](int part, int32_t b, int32_t e) {
-            std::vector<int32_t>& buf = lines[size_t(part)];
-            buf.resize(3 * size_t(kColumnChunk) * size_t(v1i1 - v1i0 + 1));
-            for (int32_t chunk = b; chunk < e; ++chunk) {
-                const int32_t x0 = h2i0 + chunk * kColumnChunk;
-                const int32_t x1 = std::min(x0 + kColumnChunk, h2i1);
-                if (x1 - x0 == kColumnChunk)
-                    columnChunk<3 * kColumnChunk>(cv, x0, 0, buf.data());
-                else
-                    columnChunk<0>(cv, x0, 3 * size_t(x1 - x0), buf.data());
-            }
-        });
-    }
+    const int32_t columns = h2i1 - h2i0;
+    const int32_t chunks = (columns + kColumnChunk - 1) / kColumnChunk;
+    const cColumns cv{rows, rowStride, g.H, v1i0, v1i1, v2i0, v2i1, &v1, &v2, v1Special, v2Special};
+    auto columnsPart = [&](int part, int32_t b, int32_t e) {
+        std::vector<int32_t>& buf = lines[size_t(part)];
+        buf.resize(3 * size_t(kColumnChunk) * size_t(v1i1 - v1i0 + 1));
+        for (int32_t chunk = b; chunk < e; ++chunk) {
+            const int32_t x0 = h2i0 + chunk * kColumnChunk;
+            const int32_t x1 = std::min(x0 + kColumnChunk, h2i1);
+            if (x1 - x0 == kColumnChunk)
+                columnChunk<3 * kColumnChunk>(cv, x0, 0, buf.data());
+            else
+                columnChunk<0>(cv, x0, 3 * size_t(x1 - x0), buf.data());
+        }
+    };
 
     // Mix, Lab back and the host's depth over whole core rows. A frame position clamped onto a
     // stored edge pixel is mixed once per position: those few pixels are redone afterwards.
-    KERNEL::timing::cStageClock clock(KERNEL::timing::kFastMix);
     const int64_t colMultFirst = multiplicity(h2i0, fx0, fx1, g.W), colMultLast = multiplicity(h2i1 - 1, fx0, fx1, g.W);
-    pool.parallelFor(v2i1 - v2i0, [&](int, int32_t b, int32_t e) {
+    auto mixPart = [&](int, int32_t b, int32_t e) {
         for (int32_t y = v2i0 + b; y < v2i0 + e; ++y) {
             const S* in = reinterpret_cast<const S*>(source.data + size_t(y) * source.rowBytes) + size_t(h2i0) * size_t(ch);
             S* out = reinterpret_cast<S*>(destination.data + size_t(y) * destination.rowBytes) + size_t(h2i0) * size_t(ch);
@@ -418,6 +412,20 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
                 }
             }
         }
+    };
+
+    // One section per tile, a barrier between the phases; part 0 times them.
+    pool.parallelSection([&](KERNEL::cWorkerPool::cSection& s) {
+        auto phase = [&](KERNEL::timing::Stage stage, int32_t count, const auto& body, bool last) {
+            std::optional<KERNEL::timing::cStageClock> clock;
+            if (s.part == 0) clock.emplace(stage);
+            const auto [b, e] = s.share(count);
+            if (b < e) body(s.part, b, e);
+            if (!last) s.sync();
+        };
+        phase(KERNEL::timing::kFastRows, r1 - r0, rowsPart, false);
+        phase(KERNEL::timing::kFastColumns, chunks, columnsPart, false);
+        phase(KERNEL::timing::kFastMix, v2i1 - v2i0, mixPart, true);
     });
 }
 
