@@ -60,14 +60,22 @@ inline int32_t boxMean(int32_t sum) { return int32_t(float(sum) * kBoxScale); }
 // Box means along an interleaved 3-channel line: ext holds positions i0 - kR .. i0 + count - 1 + kR
 // (already clamped), out receives `count` pixels. Each sum is taken afresh from its 13 taps: the
 // taps are exact integers, so this equals a running sum, and it has no serial dependency.
-__attribute__((target_clones("avx2", "default"))) void boxLine(const int32_t* __restrict ext, int32_t count,
-                                                               int32_t* __restrict out) {
+template <class T>
+inline void boxLineT(const int32_t* __restrict ext, int32_t count, T* __restrict out) {
     const int32_t n = 3 * count;
     for (int32_t j = 0; j < n; ++j) {
         int32_t s = 0;
         for (int32_t k = 0; k < kN; ++k) s += ext[j + 3 * k];
-        out[j] = boxMean(s);
+        out[j] = T(boxMean(s));
     }
+}
+__attribute__((target_clones("avx2", "default"))) void boxLine(const int32_t* ext, int32_t count, int32_t* out) {
+    boxLineT(ext, count, out);
+}
+// Means of host samples' Lab or RGB values lie in 0..65535 (a and b of host samples cannot reach
+// -1), so the tile's row-pass and column-pass results are kept in 16 bits: half the cache.
+__attribute__((target_clones("avx2", "default"))) void boxLine(const int32_t* ext, int32_t count, uint16_t* out) {
+    boxLineT(ext, count, out);
 }
 
 // Host sample to the working scale: 8-bit << 8; 16-bit clamped to 32767, << 1.
@@ -132,11 +140,11 @@ inline void convertSpan(const S* __restrict in, int32_t ch, int32_t n, int32_t* 
 // The mix for `n` pixels of one core row, each taken once: L = (blurred L + 2 x input L) / 3, then
 // Lab back and the host's depth. The alpha sample, if any, is left as it is.
 template <class S, int CH>
-inline void mixSpan(const S* in, const int32_t* __restrict blur, int32_t ch, int32_t n, S* out) {
+inline void mixSpan(const S* in, const uint16_t* __restrict blur, int32_t ch, int32_t n, S* out) {
     const int32_t step = CH != 0 ? CH : ch;
     for (int32_t i = 0; i < n; ++i) {
         const S* p = in + size_t(i) * size_t(step);
-        const int32_t* t = blur + 3 * i;
+        const uint16_t* t = blur + 3 * i;
         const int32_t R0 = toWork<S>(p[0]), G0 = toWork<S>(p[1]), B0 = toWork<S>(p[2]);
         const int32_t Ls = ((2 * R0 + 3 * G0 + B0) * 170) >> 10;
         // Both terms are >= 0: the unsigned division is the signed one and vectorises.
@@ -152,7 +160,7 @@ inline void mixSpan(const S* in, const int32_t* __restrict blur, int32_t ch, int
 
 // One pixel whose frame position is taken `times` times (clamped edges): the mix repeats.
 template <class S>
-inline void mixPixel(const S* p, const int32_t* t, int64_t times, S* o) {
+inline void mixPixel(const S* p, const uint16_t* t, int64_t times, S* o) {
     const int32_t R0 = toWork<S>(p[0]), G0 = toWork<S>(p[1]), B0 = toWork<S>(p[2]);
     const int32_t Ls = ((2 * R0 + 3 * G0 + B0) * 170) >> 10;
     int32_t L = (t[0] + 2 * Ls) / 3;
@@ -179,7 +187,7 @@ struct cKernels {
                                                                            int32_t* out) {
         convertSpan<S, CH, true>(in, ch, n, out);
     }
-    __attribute__((target_clones("avx2", "default"))) static void mix(const S* in, const int32_t* blur, int32_t ch,
+    __attribute__((target_clones("avx2", "default"))) static void mix(const S* in, const uint16_t* blur, int32_t ch,
                                                                     int32_t n, S* out) {
         mixSpan<S, CH>(in, blur, ch, n, out);
     }
@@ -187,8 +195,9 @@ struct cKernels {
 
 // What the column passes need to know about a tile.
 struct cColumns {
-    int32_t* rows;
+    uint16_t* rows;
     size_t rowStride;
+    int32_t rowsX0;  // first column held in `rows`
     int32_t H;
     int32_t v1i0, v1i1, v2i0, v2i1;
     const cPass* v1;
@@ -205,15 +214,15 @@ __attribute__((target_clones("avx2", "default"))) void columnChunk(const cColumn
     constexpr size_t K3 = 3 * size_t(kColumnChunk);
     int32_t* __restrict col = scratch;                                   // first pass, rows v1i0 .. v1i1
     int32_t* __restrict sums = scratch + K3 * size_t(t.v1i1 - t.v1i0);  // running sums
-    int32_t* const rows = t.rows;
-    auto rowAt = [&](int64_t y) -> const int32_t* {
-        return rows + size_t(clampIndex(y, t.H)) * t.rowStride + 3 * size_t(x0);
+    uint16_t* const rows = t.rows;
+    auto rowAt = [&](int64_t y) -> const uint16_t* {
+        return rows + size_t(clampIndex(y, t.H)) * t.rowStride + 3 * size_t(x0 - t.rowsX0);
     };
     auto colAt = [&](int64_t y) -> const int32_t* { return col + K3 * size_t(clampIndex(y, t.H) - t.v1i0); };
     auto sumAround = [&](auto at, int64_t centre) {
         for (size_t c = 0; c < n; ++c) sums[c] = 0;
         for (int32_t k = -kR; k <= kR; ++k) {
-            const int32_t* r = at(centre + k);
+            const auto* r = at(centre + k);
             for (size_t c = 0; c < n; ++c) sums[c] += r[c];
         }
     };
@@ -225,8 +234,8 @@ __attribute__((target_clones("avx2", "default"))) void columnChunk(const cColumn
             for (size_t c = 0; c < n; ++c) o[c] = boxMean(sums[c]);
             break;
         }
-        const int32_t* lead = rowAt(int64_t(i) + kR + 1);
-        const int32_t* trail = rowAt(int64_t(i) - kR);
+        const uint16_t* lead = rowAt(int64_t(i) + kR + 1);
+        const uint16_t* trail = rowAt(int64_t(i) - kR);
         for (size_t c = 0; c < n; ++c) {
             o[c] = boxMean(sums[c]);
             sums[c] += lead[c] - trail[c];
@@ -241,7 +250,7 @@ __attribute__((target_clones("avx2", "default"))) void columnChunk(const cColumn
     const int32_t special = t.v2Special ? t.v2->hi - 1 : -1;
     sumAround(colAt, t.v2i0);
     for (int32_t y = t.v2i0; y < t.v2i1; ++y) {
-        int32_t* __restrict o = rows + size_t(y) * t.rowStride + 3 * size_t(x0);
+        uint16_t* __restrict o = rows + size_t(y) * t.rowStride + 3 * size_t(x0 - t.rowsX0);
         if (y == special) {
             int32_t last[K3];
             for (size_t c = 0; c < n; ++c) last[c] = 0;
@@ -249,9 +258,9 @@ __attribute__((target_clones("avx2", "default"))) void columnChunk(const cColumn
                 const int32_t* r = colAt(int64_t(t.v2->b) - 1 + k);
                 for (size_t c = 0; c < n; ++c) last[c] += r[c];
             }
-            for (size_t c = 0; c < n; ++c) o[c] = boxMean(last[c]);
+            for (size_t c = 0; c < n; ++c) o[c] = uint16_t(boxMean(last[c]));
         } else {
-            for (size_t c = 0; c < n; ++c) o[c] = boxMean(sums[c]);
+            for (size_t c = 0; c < n; ++c) o[c] = uint16_t(boxMean(sums[c]));
         }
         if (y + 1 == t.v2i1) break;
         const int32_t* lead = colAt(int64_t(y) + kR + 1);
@@ -267,7 +276,7 @@ struct cGeometry {
 };
 
 template <class S, int CH>
-void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorkerPool& pool, int32_t* rows,
+void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorkerPool& pool, uint16_t* rows,
              std::vector<std::vector<int32_t>>& lines) {
     using K = cKernels<S, CH>;
     cGeometry g{};
@@ -299,7 +308,8 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
     if (h2i0 >= h2i1 || v2i0 >= v2i1 || h1i0 >= h1i1 || v1i0 >= v1i1 || r0 >= r1) return;
 
     const int32_t ch = int32_t(source.bytesPerPixel / sizeof(S));
-    const size_t rowStride = size_t(g.W) * 3;
+    // `rows` holds the core's columns, row by row over the whole tile height.
+    const size_t rowStride = size_t(h2i1 - h2i0) * 3;
     const bool h1Special = h1.special(h1i0, h1i1), h2Special = h2.special(h2i0, h2i1);
     const bool v1Special = v1.special(v1i0, v1i1), v2Special = v2.special(v2i0, v2i1);
 
@@ -355,15 +365,15 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
             replicate(e2, 0, std::max(0, -q0), -q0);
             replicate(e2, std::max(0, g.W - q0), q1 - q0, g.W - 1 - q0);
 
-            int32_t* out = rows + size_t(y) * rowStride;
-            boxLine(e2, h2i1 - h2i0, out + 3 * size_t(h2i0));
+            uint16_t* out = rows + size_t(y) * rowStride;
+            boxLine(e2, h2i1 - h2i0, out);
             if (h2Special) {
                 int32_t sum[3] = {0, 0, 0};
                 for (int32_t k = -kR; k <= kR; ++k) {
                     const int32_t* v = e2 + 3 * size_t(clampIndex(int64_t(h2.b) - 1 + k, g.W) - q0);
                     for (int c = 0; c < 3; ++c) sum[c] += v[c];
                 }
-                for (int c = 0; c < 3; ++c) out[3 * size_t(h2.hi - 1) + c] = boxMean(sum[c]);
+                for (int c = 0; c < 3; ++c) out[3 * size_t(h2.hi - 1 - h2i0) + c] = uint16_t(boxMean(sum[c]));
             }
         }
     };
@@ -372,7 +382,7 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
     // core rows in `rows`, which no other chunk reads.
     const int32_t columns = h2i1 - h2i0;
     const int32_t chunks = (columns + kColumnChunk - 1) / kColumnChunk;
-    const cColumns cv{rows, rowStride, g.H, v1i0, v1i1, v2i0, v2i1, &v1, &v2, v1Special, v2Special};
+    const cColumns cv{rows, rowStride, h2i0, g.H, v1i0, v1i1, v2i0, v2i1, &v1, &v2, v1Special, v2Special};
     auto columnsPart = [&](int part, int32_t b, int32_t e) {
         std::vector<int32_t>& buf = lines[size_t(part)];
         buf.resize(3 * size_t(kColumnChunk) * size_t(v1i1 - v1i0 + 1));
@@ -393,7 +403,7 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
         for (int32_t y = v2i0 + b; y < v2i0 + e; ++y) {
             const S* in = reinterpret_cast<const S*>(source.data + size_t(y) * source.rowBytes) + size_t(h2i0) * size_t(ch);
             S* out = reinterpret_cast<S*>(destination.data + size_t(y) * destination.rowBytes) + size_t(h2i0) * size_t(ch);
-            const int32_t* blur = rows + size_t(y) * rowStride + 3 * size_t(h2i0);
+            const uint16_t* blur = rows + size_t(y) * rowStride;
             const int32_t n = h2i1 - h2i0;
             const int64_t rowMult = multiplicity(y, fy0, fy1, g.H);
             if (rowMult == 1) {
@@ -446,13 +456,13 @@ bool cDefaultChainTile::Accepts(const cPixelBlock& s, const cPixelBlock& d) {
 
 void cDefaultChainTile::Run(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorkerPool& pool) {
     if (lines.size() < size_t(pool.Threads())) lines.resize(size_t(pool.Threads()));
-    const uint64_t bytes = uint64_t(source.outerRect.width()) * uint64_t(source.outerRect.height()) * 3 * sizeof(int32_t);
+    const uint64_t bytes = uint64_t(source.outerRect.width()) * uint64_t(source.outerRect.height()) * 3 * sizeof(uint16_t);
     if (!rowsMemory || rowsMemory->Size() < bytes) {
         rows = nullptr;
         rowsMemory.reset();
         if (bytes > UINT32_MAX) throw KERNEL::cMEMException("could not allocate mem handle", 18, "kernel/Memory");
         auto memory = std::make_unique<KERNEL::cMEM>(uint32_t(bytes));
-        rows = static_cast<int32_t*>(memory->Lock());
+        rows = static_cast<uint16_t*>(memory->Lock());
         rowsMemory = std::move(memory);
     }
     const size_t channels = source.bytesPerPixel / source.bytesPerSample;
