@@ -21,6 +21,20 @@ std::uint16_t paddingValue(int padding, int depth) {
 
 namespace {
 
+// Flat runs of samples between the image (16-bit storage) and a tile buffer; AVX2 where the
+// machine has it.
+__attribute__((target_clones("avx2", "default"))) void narrowRun(const std::uint16_t* __restrict src,
+                                                                 std::uint8_t* __restrict dst, std::size_t n) {
+    for (std::size_t i = 0; i < n; ++i) dst[i] = std::uint8_t(src[i]);
+}
+__attribute__((target_clones("avx2", "default"))) void widenRun(const std::uint8_t* __restrict src,
+                                                                std::uint16_t* __restrict dst, std::size_t n) {
+    for (std::size_t i = 0; i < n; ++i) dst[i] = src[i];
+}
+void copyRun(const std::uint16_t* src, std::uint8_t* dst, std::size_t n) { narrowRun(src, dst, n); }
+void copyRun(const std::uint16_t* src, std::uint16_t* dst, std::size_t n) { std::memcpy(dst, src, n * 2); }
+void copyRun(const std::uint8_t* src, std::uint16_t* dst, std::size_t n) { widenRun(src, dst, n); }
+
 template <typename Sample>
 void fillRows(const Image& image, const Area& area, int lo, int hi, int padding, std::uint8_t* base,
               std::int32_t rowBytes) {
@@ -36,10 +50,9 @@ void fillRows(const Image& image, const Area& area, int lo, int hi, int padding,
         // served: a plain converting copy.
         const int inLeft = std::clamp(area.left, 0, image.width), inRight = std::clamp(area.right, 0, image.width);
         if (rowInside && planes == image.channels && inLeft < inRight) {
-            const std::uint16_t* __restrict src = &image.samples[image.index(inLeft, sy, 0)];
-            Sample* __restrict dst = row + std::size_t(inLeft - area.left) * std::size_t(planes);
-            const std::size_t n = std::size_t(inRight - inLeft) * std::size_t(planes);
-            for (std::size_t i = 0; i < n; ++i) dst[i] = Sample(src[i]);
+            const std::uint16_t* src = &image.samples[image.index(inLeft, sy, 0)];
+            Sample* dst = row + std::size_t(inLeft - area.left) * std::size_t(planes);
+            copyRun(src, dst, std::size_t(inRight - inLeft) * std::size_t(planes));
         }
         for (int x = area.left; x < area.right; ++x) {
             if (rowInside && planes == image.channels && x >= inLeft && x < inRight) {
@@ -66,10 +79,9 @@ void storeRows(Image& image, const Area& area, const Area& clip, int lo, int hi,
     for (int y = clip.top; y < clip.bottom; ++y) {
         const auto* row = reinterpret_cast<const Sample*>(base + std::size_t(y - area.top) * std::size_t(rowBytes));
         if (planes == image.channels) {
-            const Sample* __restrict src = row + std::size_t(clip.left - area.left) * std::size_t(planes);
-            std::uint16_t* __restrict dst = &image.samples[image.index(clip.left, y, 0)];
-            const std::size_t n = std::size_t(clip.right - clip.left) * std::size_t(planes);
-            for (std::size_t i = 0; i < n; ++i) dst[i] = std::uint16_t(src[i]);
+            const Sample* src = row + std::size_t(clip.left - area.left) * std::size_t(planes);
+            std::uint16_t* dst = &image.samples[image.index(clip.left, y, 0)];
+            copyRun(src, dst, std::size_t(clip.right - clip.left) * std::size_t(planes));
             continue;
         }
         for (int x = clip.left; x < clip.right; ++x) {

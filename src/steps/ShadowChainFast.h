@@ -29,6 +29,6 @@ private:
     // The row passes' result, tile-sized: host buffer memory like every working block, taken at the
     // first tile and kept locked for the next ones.
     std::unique_ptr<KERNEL::cMEM> rowsMemory;
-    int32_t* rows = nullptr;
+    uint16_t* rows = nullptr;
     std::vector<std::vector<int32_t>> lines;  // per-thread lines and column sweeps
 };
