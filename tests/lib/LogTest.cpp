@@ -51,12 +51,4 @@ TEST(Log, AFaultySinkDoesNotReachTheCaller) {
     EXPECT_EQ(capture.messages(Level::Error).size(), 1u);
 }
 
-TEST(Log, LevelNamesMatchTheEnvironmentSwitch) {
-    EXPECT_EQ(vek::debug::levelName(Level::Debug), "debug");
-    EXPECT_EQ(vek::debug::levelName(Level::Warning), "warning");
-    vek::debug::setConsoleLevel(Level::Error);
-    EXPECT_EQ(vek::debug::consoleLevel(), Level::Error);
-    vek::debug::setConsoleLevel(Level::Off);
-}
-
 }  // namespace

@@ -62,7 +62,6 @@ TEST(Number, RandomBitPatternsRoundTrip) {
 }
 
 TEST(Number, IntegersCoverTheirWholeRange) {
-    expectExactRoundTrip(0.0);
     EXPECT_EQ(parseNumber<int32_t>(formatNumber(INT32_MIN)), INT32_MIN);
     EXPECT_EQ(parseNumber<uint32_t>(formatNumber(UINT32_MAX)), UINT32_MAX);
     EXPECT_EQ(parseNumber<int64_t>(formatNumber(INT64_MIN)), INT64_MIN);

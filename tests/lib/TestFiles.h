@@ -1,4 +1,4 @@
-// File helpers for the foundation and configuration tests.
+// File and environment helpers for the foundation, configuration and interface tests.
 #pragma once
 
 #include <sys/resource.h>
@@ -43,7 +43,10 @@ inline std::string readFile(const std::filesystem::path& path) {
     return s.str();
 }
 
+// Creates missing parent folders; a parent that is a plain file makes the write fail silently.
 inline void writeFile(const std::filesystem::path& path, const std::string& content) {
+    std::error_code ignored;
+    std::filesystem::create_directories(path.parent_path(), ignored);
     std::ofstream out(path, std::ios::binary | std::ios::trunc);
     out << content;
 }
@@ -94,6 +97,13 @@ private:
     std::string name_;
     std::string old_;
     bool hadOld_ = false;
+};
+
+// Points HOME at `folder` and XDG_CONFIG_HOME at its "config" subfolder for the scope.
+struct ScopedUserFolders {
+    explicit ScopedUserFolders(const std::filesystem::path& folder)
+        : home("HOME", folder.c_str()), xdg("XDG_CONFIG_HOME", (folder / "config").c_str()) {}
+    ScopedEnv home, xdg;
 };
 
 }  // namespace vek::testing
