@@ -6,7 +6,7 @@
 #include <string>
 
 #include "config/SettingsConfigFile.h"
-#include "TempFolder.h"
+#include "lib/TestFiles.h"
 #include "ui/DOM.h"
 #include "ui/Localization.h"
 
@@ -29,8 +29,8 @@ protected:
     void SetUp() override { ReleaseLocalization(); }
     void TearDown() override { ReleaseLocalization(); }
 
-    TempFolder temp;
-    ScopedUserFolders folders{temp.path()};
+    vek::testing::TempDir temp;
+    vek::testing::ScopedUserFolders folders{temp.path()};
 };
 
 TEST_F(CatalogTest, WithoutSettingsFileTheRegionIsEnUs) {
@@ -75,36 +75,47 @@ TEST_F(CatalogTest, KoreanFromTheSettingsFile) {
     EXPECT_EQ(Translate("@T.Dialog.Title"), L"제목");
 }
 
-TEST_F(CatalogTest, CapitalRegionCodesAndKeysMatchWithoutCase) {
-    CreateCatalog(ChooseLanguage("de", "de"));
-    LoadCatalogText(titleCatalogue({{"EN:US", "Title"}, {"DE:De", "Titel"}}), "@Quell2");
-    EXPECT_EQ(Translate("@Quell2.Dialog.Title"), L"Titel");
-    EXPECT_EQ(Translate("@QUELL2.DIALOG.TITLE"), L"Titel");
-    EXPECT_EQ(Translate("@quell2.dialog.title"), L"Titel");
-}
-
-TEST_F(CatalogTest, OnlyALocalizationRootCounts) {
-    CreateCatalog(Language{});
-    LoadCatalogText("<catalog><key name=\"A\"><language regioncode=\"en:us\">a</language></key></catalog>", "@T");
-    LoadCatalogText("<Localization><key name=\"A\"><language regioncode=\"en:us\">a</language></key></Localization>",
-                    "@T");
-    EXPECT_EQ(TextCatalog::current()->size(), 0u);
-    EXPECT_EQ(Translate("@T.A"), L"@T.A");
-}
-
-TEST_F(CatalogTest, LanguageOutsideAKeyAndOtherElementsAreIgnored) {
-    CreateCatalog(Language{});
-    LoadCatalogText(catalogue("<language regioncode=\"en:us\">stray</language>"
-                              "<group><key name=\"Hidden\"><language regioncode=\"en:us\">h</language></key></group>"
-                              "<key name=\"A\"><note><language regioncode=\"en:us\">n</language></note>"
-                              "<language regioncode=\"en:us\">a</language></key>"),
-                    "@T");
-    EXPECT_EQ(TextCatalog::current()->size(), 1u);
-    EXPECT_EQ(Translate("@T.A"), L"a");
+// Catalogues loaded into an en:us catalogue (unless `language` is set): how many keys they add and
+// what one key translates to.
+TEST_F(CatalogTest, LoadingAndLookupRules) {
+    struct Case {
+        const char* what;
+        std::string text;
+        const char* prefix;
+        size_t size;
+        const char* key;
+        const wchar_t* expected;
+        const char* language = "en";
+    };
+    const Case cases[] = {
+        {"region codes and keys without case", titleCatalogue({{"EN:US", "Title"}, {"DE:De", "Titel"}}), "@Quell2",
+         1, "@qUELL2.dialog.TITLE", L"Titel", "de"},
+        {"only a localization root", "<catalog><key name=\"A\"><language regioncode=\"en:us\">a</language></key></catalog>",
+         "@T", 0, "@T.A", L"@T.A"},
+        {"root name case", "<Localization><key name=\"A\"><language regioncode=\"en:us\">a</language></key></Localization>",
+         "@T", 0, "@T.A", L"@T.A"},
+        {"language outside a key, other elements",
+         catalogue("<language regioncode=\"en:us\">stray</language>"
+                   "<group><key name=\"Hidden\"><language regioncode=\"en:us\">h</language></key></group>"
+                   "<key name=\"A\"><note><language regioncode=\"en:us\">n</language></note>"
+                   "<language regioncode=\"en:us\">a</language></key>"),
+         "@T", 1, "@T.A", L"a"},
+        {"line breaks and tabs drop, spaces stay, \\n breaks",
+         titleCatalogue({{"en:us", "  One\r\n\ttwo <!-- note --> three \\nfour\\\\n  "}}), "@T", 1, "@T.Dialog.Title",
+         L"  Onetwo  three \nfour\\\n  "},
+    };
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.what);
+        ReleaseLocalization();
+        CreateCatalog(ChooseLanguage(c.language, c.language));
+        LoadCatalogText(c.text, c.prefix);
+        EXPECT_EQ(TextCatalog::current()->size(), c.size);
+        EXPECT_EQ(Translate(c.key), c.expected);
+    }
 }
 
 TEST_F(CatalogTest, TextBeforeTheDeclarationIsSkipped) {
-    temp.write("lead.loc", "\xEF\xBB\xBF garbage that is not XML\n" + titleCatalogue({{"en:us", "Hello"}}));
+    vek::testing::writeFile(temp / "lead.loc", "\xEF\xBB\xBF garbage that is not XML\n" + titleCatalogue({{"en:us", "Hello"}}));
     CreateCatalog(Language{});
     ASSERT_TRUE(LoadCatalogFile(temp.path() / "lead.loc", "@T"));
     EXPECT_EQ(Translate("@T.Dialog.Title"), L"Hello");
@@ -132,7 +143,7 @@ TEST_F(CatalogTest, AFileBeatsTheBuiltInTextAndTheFirstDefinitionWins) {
         catalogue("<key name=\"WarningsErrors\"><key name=\"TitleWarning\">"
                   "<language regioncode=\"en:us\">From the file</language></key>"
                   "<key name=\"TitleWarning\"><language regioncode=\"en:us\">Second definition</language></key></key>");
-    temp.write("module/loc/Quell2.loc", twice);
+    vek::testing::writeFile(temp / "module/loc/Quell2.loc", twice);
     LoadLocalization(temp.path() / "module");
     EXPECT_EQ(Translate("@Quell2.WarningsErrors.TitleWarning"), L"From the file");
     // Keys the file does not have still come from the module.

@@ -12,7 +12,7 @@
 #include <wx/toplevel.h>
 
 #include "Processes.h"
-#include "TempFolder.h"
+#include "lib/TestFiles.h"
 #include "ui/App.h"
 #include "ui/ErrorReport.h"
 #include "ui/Localization.h"
@@ -49,8 +49,8 @@ protected:
     }
     void TearDown() override { ReleaseLocalization(); }
 
-    TempFolder temp;
-    ScopedUserFolders folders{temp.path()};
+    vek::testing::TempDir temp;
+    vek::testing::ScopedUserFolders folders{temp.path()};
 };
 
 std::vector<wxButton*> buttonsOf(const DialogButtonPanel& panel) {
@@ -187,7 +187,7 @@ TEST_F(DialogTest, TheStoreIsInstalledForItsLifetimeAndSavedToItsFile) {
 
 TEST_F(DialogTest, ChoicesUnderTheFormerStoreNameCarryOverOnce) {
     const auto former = DialogSettingsStore::FilePath().parent_path() / "Quell 2.conf";
-    temp.write(std::filesystem::relative(former, temp.path()), "ShowErrorCreateLayer=0\n[Dialogs]\nSize=12\n");
+    vek::testing::writeFile(former, "ShowErrorCreateLayer=0\n[Dialogs]\nSize=12\n");
     {
         DialogSettingsStore store;
         EXPECT_FALSE(store.Get()->ReadBool("ShowErrorCreateLayer", true));

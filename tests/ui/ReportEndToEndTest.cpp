@@ -2,24 +2,17 @@
 // private X server driven from outside as a person would (keys), and without any display.
 #include <gtest/gtest.h>
 
-#include <algorithm>
-#include <fstream>
-#include <iterator>
 #include <sstream>
 
 #include "Processes.h"
-#include "TempFolder.h"
 #include "config/SettingsConfigFile.h"
+#include "lib/TestFiles.h"
 
 namespace {
 
 using namespace std::chrono_literals;
 namespace fs = std::filesystem;
-
-std::string readFile(const fs::path& file) {
-    std::ifstream in(file, std::ios::binary);
-    return std::string(std::istreambuf_iterator<char>(in), std::istreambuf_iterator<char>());
-}
+using vek::testing::readFile;
 
 std::string quoted(const fs::path& p) { return "'" + p.string() + "'"; }
 
@@ -53,7 +46,7 @@ protected:
 
     std::string errors(const std::string& output) const { return readFile(temp.path() / (output + ".err")); }
 
-    TempFolder temp;
+    vek::testing::TempDir temp;
 };
 
 // The window with this exact title, waiting for it up to `timeout`; empty when none appears.
@@ -114,7 +107,7 @@ TEST_F(ReportEndToEnd, ConfirmingWithoutTheBoxChangesNoSettingAndTheLanguageCome
     if (server.display().empty()) GTEST_SKIP() << "Xvfb could not be started";
     const std::string display = server.display();
     {
-        ScopedUserFolders folders(temp.path());
+        vek::testing::ScopedUserFolders folders(temp.path());
         vek::SettingsConfigFile settings;
         ASSERT_TRUE(settings.setProperty("Language", "Language", "de"));
     }
@@ -142,7 +135,7 @@ TEST_F(ReportEndToEnd, WithoutADisplayTheMessageGoesToStandardErrorOnce) {
     EXPECT_FALSE(fs::exists(settingsFile()));
 
     // Turned off in the settings: not even the log line.
-    temp.write(fs::relative(settingsFile(), temp.path()), "ShowErrorCreateLayer=0\n");
+    vek::testing::writeFile(settingsFile(), "ShowErrorCreateLayer=0\n");
     Background again(hostCommand("", "headless2.png", 3));
     ASSERT_EQ(again.wait(60s), 0) << errors("headless2.png");
     expectProcessed("headless2.png");
