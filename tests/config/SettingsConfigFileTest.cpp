@@ -42,7 +42,6 @@ TEST(SettingsConfigFile, CreatesFolderAndEmptyFileThenKeepsChanges) {
 
 TEST(SettingsConfigFile, LoadsAnExistingFile) {
     SettingsHome home;
-    fs::create_directories(home.folder());
     vek::testing::writeFile(home.file(), "<settings version=\"4\"><group name=\"General\">"
                                          "<key name=\"Language\" type=\"string\" value=\"fr\"/></group></settings>");
     SettingsConfigFile settings;
@@ -76,7 +75,6 @@ TEST(SettingsConfigFile, AFailedSaveKeepsThePreviousFile) {
 
 TEST(SettingsConfigFile, AnUnreadableFileIsNotOverwritten) {
     SettingsHome home;
-    fs::create_directories(home.folder());
     const std::string damaged = "<configuration><group name=\"General\"><key name=\"Lang";
     vek::testing::writeFile(home.file(), damaged);
     {
