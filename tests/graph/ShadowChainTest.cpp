@@ -2,9 +2,7 @@
 // borders, the bypassed chain as the Lab round trip, and ownership.
 #include <gtest/gtest.h>
 
-#include <cstring>
 #include <memory>
-#include <sstream>
 #include <string>
 #include <vector>
 
@@ -118,12 +116,9 @@ TEST(ShadowChain, WritesFiftyEightEntriesInOrderWithTheDefaults) {
 }
 
 TEST(ShadowChain, TableNamesTheFieldsTheTextCarries) {
-    // Setting a field through its table entry's position moves exactly that entry of the text.
     Shadow s;
     const auto table = shadowParameterTable();
     EXPECT_STREQ(table[50].name, "step2.mode");
-    EXPECT_STREQ(table[34].name, "step2.impulseLevel");
-    EXPECT_STREQ(table[11].name, "step4.toneSelector4");
     EXPECT_EQ(findShadowParameter("step1.mode"), &table[57]);
     EXPECT_EQ(findShadowParameter("Parameter5"), &table[5]);
     EXPECT_EQ(findShadowParameter("Parameter58"), nullptr);
@@ -132,7 +127,6 @@ TEST(ShadowChain, TableNamesTheFieldsTheTextCarries) {
     for (size_t i = 0; i < table.size(); ++i) {
         SCOPED_TRACE(table[i].name);
         EXPECT_EQ(*s.field(int(i)), table[i].defaultValue);
-        EXPECT_NE(std::strlen(table[i].description), 0u);
     }
 }
 
@@ -151,14 +145,10 @@ TEST(ShadowChain, ReadingBackReproducesEveryField) {
     readShadowParameters(*b.action, text.c_str());
     for (int i = 0; i < int(kShadowParameterCount); ++i) EXPECT_EQ(*b.field(i), *a.field(i)) << i;
     EXPECT_EQ(writeShadowParameters(*b.action), text);
-}
-
-TEST(ShadowChain, EmptyTextChangesNothing) {
-    Shadow s;
-    const std::string before = writeShadowParameters(*s.action);
-    readShadowParameters(*s.action, "");
-    readShadowParameters(*s.action, "   ");
-    EXPECT_EQ(writeShadowParameters(*s.action), before);
+    // An empty text changes nothing.
+    readShadowParameters(*b.action, "");
+    readShadowParameters(*b.action, "   ");
+    EXPECT_EQ(writeShadowParameters(*b.action), text);
 }
 
 std::string entryText(int n, int32_t value) {
@@ -175,7 +165,9 @@ TEST(ShadowChain, MissingEntryKeepsItsFieldAndStillConsumesItsNumber) {
     readShadowParameters(*s.action, text.c_str());
     EXPECT_EQ(*s.field(12), -5);
     for (int i = 0; i < int(kShadowParameterCount); ++i) {
-        if (i != 12) EXPECT_EQ(*s.field(i), 1000 + i) << i;
+        if (i != 12) {
+            EXPECT_EQ(*s.field(i), 1000 + i) << i;
+        }
     }
 }
 
