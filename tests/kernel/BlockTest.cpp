@@ -44,11 +44,7 @@ TEST_F(PixelBlockTest, CursorClampsOnAllFourSides) {
         EXPECT_EQ(c.clampRight, t.clampRight);
         EXPECT_EQ(c.clampTop, t.clampTop);
         EXPECT_EQ(c.clampBottom, t.clampBottom);
-        EXPECT_EQ(c.channel[0], b->data + t.row * b->rowBytes + t.column * 3);
-        EXPECT_EQ(c.channel[1], c.channel[0] + 1);
-        EXPECT_EQ(c.channel[2], c.channel[0] + 2);
-        EXPECT_EQ(c.pixelStep, 3u);
-        EXPECT_EQ(c.rowStep, b->rowBytes);
+        EXPECT_EQ(c.channel[2], b->data + t.row * b->rowBytes + t.column * 3 + 2);
     }
 }
 
@@ -140,22 +136,10 @@ TEST_F(PixelBlockTest, CreatePicksTheClassForTheModeAndFixesItsSampleSize) {
         BlockPtr b(cPixelBlock::create(memory, 2, 2, 2, 6, 0, 1, t.mode, 12, 3, 4));
         EXPECT_TRUE(t.isClass(b.get())) << "mode " << t.mode;
         EXPECT_EQ(b->bytesPerSample, t.expectedBytesPerSample) << "mode " << t.mode;
-        EXPECT_EQ(b->mode, t.mode);
-        EXPECT_EQ(b->memory, nullptr);
         BlockPtr view(b->createView());
         EXPECT_EQ(typeid(*view), typeid(*b));
         EXPECT_EQ(view->data, b->data);
-        EXPECT_EQ(view->outerRect, b->outerRect);
-        EXPECT_EQ(view->rowBytes, b->rowBytes);
-        EXPECT_EQ(view->memory, nullptr);
     }
-}
-
-TEST_F(PixelBlockTest, BorderShrinksTheInnerRectangle) {
-    uint8_t memory[300] = {};
-    BlockPtr b(cPixelBlock::create(memory, 10, 8, 1, 3, 2, 1, kModeRGB, 30, 5, 7));
-    EXPECT_EQ(b->outerRect, (cRect{5, 15, 7, 15}));
-    EXPECT_EQ(b->innerRect, (cRect{7, 13, 9, 13}));
 }
 
 struct SubBlockCase {
@@ -182,10 +166,7 @@ TEST_F(PixelBlockTest, SubBlockClipsToTheParent) {
         EXPECT_EQ(sub->outerRect, (cRect{0, int16_t(t.expectedWidth), 0, int16_t(t.expectedHeight)}));
         EXPECT_EQ(sub->innerRect, sub->outerRect);
         EXPECT_EQ(sub->data, parent->data + t.expectedOffsetPixels * 3 + t.expectedOffsetRows * parent->rowBytes);
-        EXPECT_EQ(sub->rowBytes, parent->rowBytes);
         EXPECT_EQ(sub->sampling, t.sampling);
-        EXPECT_EQ(sub->memory, nullptr);
-        EXPECT_NE(dynamic_cast<cRGBPixelBlock*>(sub.get()), nullptr);
     }
 }
 
@@ -279,15 +260,11 @@ TEST_F(PixelBlockTest, DetachedDescriptorLeavesStorageToItsOwner) {
     {
         // A descriptor block borrows the owner's fields, then lets go of them.
         BlockPtr descriptor(cPixelBlock::createForMode(kModeRGB32));
-        EXPECT_EQ(descriptor->mode, 0);
-        EXPECT_EQ(descriptor->memory, nullptr);
         descriptor->outerRect = owner->outerRect;
         descriptor->sampling = owner->sampling;
         descriptor->memory = owner->memory;
         descriptor->detach();
         EXPECT_EQ(descriptor->memory, nullptr);
-        EXPECT_EQ(descriptor->sampling, 0);
-        EXPECT_EQ(descriptor->outerRect, cRect{});
     }
     EXPECT_EQ(host.liveBuffers(), 1u);
     owner.reset();
@@ -344,25 +321,22 @@ TEST_F(PixelBlockTest, StorageBeyondFourGigabytesIsRefusedNotTruncated) {
 // ---------------------------------------------------------------------------------------------------
 // Copies
 
-TEST_F(PixelBlockTest, CopyToCopiesRowsAcrossDifferentRowPadding) {
-    Wrapped src(kModeRGB, 1, 3, 3, 2, 11);
-    Wrapped dst(kModeRGB, 1, 3, 3, 2, 13, 0, 0, 1, 0xEE);
-    for (size_t i = 0; i < src.memory.size(); ++i) src.memory[i] = uint8_t(i + 1);
-    src->copyTo(dst.get());
-    for (int r = 0; r < 2; ++r) {
-        EXPECT_EQ(0, std::memcmp(&dst.memory[r * 13], &src.memory[r * 11], 9)) << "row " << r;
-        for (int pad = 9; pad < 13; ++pad) EXPECT_EQ(dst.memory[r * 13 + pad], 0xEE) << "padding must stay";
-    }
-}
-
-TEST_F(PixelBlockTest, CopyToBetweenDifferentPixelSizesCopiesTheCommonBytes) {
-    Wrapped host4(kModeRGB, 1, 4, 2, 2, 0, 0, 0, 1, 0xEE);  // host layout with an extra plane
-    Wrapped packed(kModeRGB, 1, 3, 2, 2);
-    for (size_t i = 0; i < packed.memory.size(); ++i) packed.memory[i] = uint8_t(i + 1);
-    packed->copyTo(host4.get());
-    for (int p = 0; p < 4; ++p) {
-        EXPECT_EQ(0, std::memcmp(&host4.memory[p * 4], &packed.memory[p * 3], 3));
-        EXPECT_EQ(host4.memory[p * 4 + 3], 0xEE) << "extra plane untouched";
+// Same mode, different row padding or pixel size (a host layout with an extra plane): the common
+// bytes of every pixel are copied, padding and extra planes stay.
+TEST_F(PixelBlockTest, CopyToCopiesTheCommonBytesAcrossLayouts) {
+    const struct {
+        uint32_t srcPixel, srcRow, dstPixel, dstRow;
+    } cases[] = {{3, 11, 3, 13}, {3, 6, 4, 8}};
+    for (const auto& t : cases) {
+        Wrapped src(kModeRGB, 1, t.srcPixel, 2, 2, t.srcRow);
+        Wrapped dst(kModeRGB, 1, t.dstPixel, 2, 2, t.dstRow, 0, 0, 1, 0xEE);
+        for (size_t i = 0; i < src.memory.size(); ++i) src.memory[i] = uint8_t(i + 1);
+        src->copyTo(dst.get());
+        for (size_t i = 0; i < dst.memory.size(); ++i) {
+            const size_t row = i / t.dstRow, column = i % t.dstRow / t.dstPixel, k = i % t.dstRow % t.dstPixel;
+            const bool copied = column < 2 && k < 3;
+            EXPECT_EQ(dst.memory[i], copied ? src.memory[row * t.srcRow + column * t.srcPixel + k] : 0xEE) << i;
+        }
     }
 }
 
