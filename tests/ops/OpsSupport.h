@@ -1,5 +1,8 @@
-// Working blocks over test-owned memory, and a plain cursor-walk blurLarge to compare against.
+// Working blocks over test-owned memory, a leak-checking fixture, and a plain cursor-walk blurLarge
+// to compare against.
 #pragma once
+
+#include <gtest/gtest.h>
 
 #include <cstring>
 #include <memory>
@@ -21,6 +24,13 @@ struct Block {
     int32_t& at(int32_t col, int32_t row, int c) { return mem[(size_t(row) * cols + col) * 3 + c]; }
     cRGB32PixelBlock* operator->() { return b.get(); }
     cRGB32PixelBlock* get() { return b.get(); }
+};
+
+// Every host buffer must be given back by the end of each test.
+class LeakCheckedTest : public ::testing::Test {
+protected:
+    void TearDown() override { EXPECT_EQ(host.liveBuffers(), 0u) << "leaked host buffer"; }
+    testsupport::MallocHost host;
 };
 
 inline Block makeBlock(cRect outer, cRect inner, int32_t s = 1) {

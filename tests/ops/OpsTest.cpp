@@ -10,11 +10,7 @@ using namespace opstest;
 
 namespace {
 
-class Ops : public ::testing::Test {
-protected:
-    void TearDown() override { EXPECT_EQ(host.liveBuffers(), 0u) << "leaked host buffer"; }
-    testsupport::MallocHost host;
-};
+using Ops = LeakCheckedTest;
 
 struct BlurCase {
     cRect outer, inner;

@@ -12,10 +12,8 @@ using namespace opstest;
 
 namespace {
 
-class Step2 : public ::testing::Test {
+class Step2 : public LeakCheckedTest {
 protected:
-    void TearDown() override { EXPECT_EQ(host.liveBuffers(), 0u) << "leaked host buffer"; }
-    testsupport::MallocHost host;
     cStep2 step{nullptr, &host, nullptr, nullptr};
 };
 
@@ -109,27 +107,12 @@ TEST_F(Step2, CopyModesAndNegativeModes) {
     }
 }
 
-// Every mode runs on a tile whose processing rectangle sticks out, with hostile parameters, and
-// leaves no buffer behind.
-TEST_F(Step2, EveryModeRunsWithExtremeParameters) {
-    step.lumaMedianRadius = 1000000;
+// Every mode at hostile settings is swept through the module by the robustness tests; here the one
+// with a known answer: mode 7 with the divisor 0 taken as 1 gives a pixel far from the reference
+// colour its L back.
+TEST_F(Step2, Mode7WithZeroDivisorKeepsFarPixels) {
     step.colourTolerance7 = -3;  // q + 2 == 0
     step.waveletStrength7 = INT32_MAX;
-    step.impulseLevel = INT32_MIN;
-    step.lumaKeepPercent5 = INT32_MAX;
-    step.smoothStrength4 = INT32_MIN;
-    for (int32_t mode : {1, 2, 3, 4, 5, 6, 7, 9, 100, 101, 102, 103, 104, 105, 106, 107, 108}) {
-        for (int32_t preset : {0, 1, 2, 3}) {
-            step.preset9 = preset;
-            Block src = tile();
-            fillRandom(src, 8, -1, 65535);
-            Block dst = copyOf(src);
-            step.mode = mode;
-            step.Process(src.get(), dst.get());
-            if (mode != 9) break;
-        }
-    }
-    // Mode 7 with the divisor 0 taken as 1: a pixel far from the reference colour gets its L back.
     Block src = makeBlock({0, 8, 0, 8}, {0, 8, 0, 8});
     for (size_t i = 0; i < src.mem.size(); ++i) src.mem[i] = i % 3 == 0 ? 60000 : 2000;
     Block dst = copyOf(src);
