@@ -96,76 +96,36 @@ TEST_F(Step4Test, TabulatedExamples) {
     }
 }
 
-TEST_F(Step4Test, DefaultsLeaveModes1To3UnchangedAndMode3AsksForTheRectangleOnce) {
-    for (int32_t mode : {1, 2, 3}) {
-        SCOPED_TRACE(mode);
-        cStep4 step{nullptr, &host, nullptr, nullptr};
-        step.mode = mode;
-        Image img(20, 14, 5, 30);
-        img.fillRandom(uint32_t(mode));
-        auto src = img.block();
-        const int before = host.filterRectCalls;
-        auto dst = runStep(step, src.get());
-        EXPECT_EQ(host.filterRectCalls - before, mode == 3 ? 1 : 0);
-        expectSamePixels(*src, *dst);
-    }
-}
-
-TEST_F(Step4Test, OtherModesHandTheInputOn) {
-    for (int32_t mode : {6, -1, 0, kMin, kMax}) {
-        SCOPED_TRACE(mode);
-        cStep4 step{nullptr, &host, nullptr, nullptr};
-        step.mode = mode;
-        Image img(9, 7);
-        img.fillRandom(uint32_t(mode) + 3);
-        auto src = img.block(cRect{2, 8, 1, 5});
-        auto dst = runStep(step, src.get());
-        expectSamePixels(*src, *dst);
-    }
-}
-
 // Black level on the white level leaves the levels no span; they are left out (the identity) and
-// the rest of the mode still applies.
+// the rest of the mode still applies. Each case: mode, settings on both steps, settings that leave
+// no span, and whether the flat step has no host (so no filter rectangle).
 TEST_F(Step4Test, LevelsWithoutSpanAreLeftOut) {
-    struct Levels {
-        int32_t black, white;
+    struct Case {
+        const char* what;
+        int32_t mode;
+        std::function<void(cStep4&)> both, flat;
+        cRect filter = {0, 100, 0, 100};
+        bool hostless = false;
     };
-    for (Levels lv : {Levels{512, 0}, {0, 512}, {256, 256}, {300, 212}, {513, 1}}) {
-        SCOPED_TRACE(testing::Message() << lv.black << "/" << lv.white);
-        cStep4 identity{nullptr, &host, nullptr, nullptr}, flat{nullptr, &host, nullptr, nullptr};
-        flat.mode = identity.mode = 1;
-        flat.blackLevel1 = lv.black;
-        flat.whiteLevel1 = lv.white;
-        expectSameOutput(flat, identity, 11);
-
-        identity.mode = flat.mode = 2;
-        identity.curveStrength2 = flat.curveStrength2 = 10;
-        flat.blackLevel2 = lv.black;
-        flat.whiteLevel2 = lv.white;
-        expectSameOutput(flat, identity, 12);
+    std::vector<Case> cases;
+    const auto curve = [](cStep4& s) { s.curveStrength2 = s.curveStrength3 = 10; };
+    for (auto [black, white] : {std::pair{512, 0}, {0, 512}, {256, 256}, {300, 212}, {513, 1}}) {
+        cases.push_back({"levels 1", 1, [](cStep4&) {}, [=](cStep4& s) { s.blackLevel1 = black; s.whiteLevel1 = white; }});
+        cases.push_back({"levels 2", 2, curve, [=](cStep4& s) { s.blackLevel2 = black; s.whiteLevel2 = white; }});
     }
-    {
-        SCOPED_TRACE("gradient 256");
-        cStep4 identity{nullptr, &host, nullptr, nullptr}, flat{nullptr, &host, nullptr, nullptr};
-        identity.mode = flat.mode = 3;
-        identity.curveStrength3 = flat.curveStrength3 = 10;
-        flat.gradientLevel3 = 256;
-        expectSameOutput(flat, identity, 13);
-    }
-    {
-        SCOPED_TRACE("filter rectangle of height 0");
-        host.filterRect = {0, 100, 40, 40};
-        cStep4 identity{nullptr, &host, nullptr, nullptr}, flat{nullptr, &host, nullptr, nullptr};
-        identity.mode = flat.mode = 3;
-        flat.gradientLevel3 = 40;
-        expectSameOutput(flat, identity, 14);
-    }
-    {
-        SCOPED_TRACE("no host");
-        cStep4 identity{nullptr, &host, nullptr, nullptr}, flat{nullptr, nullptr, nullptr, nullptr};
-        identity.mode = flat.mode = 3;
-        flat.gradientLevel3 = 40;
-        expectSameOutput(flat, identity, 15);
+    cases.push_back({"gradient 256", 3, curve, [](cStep4& s) { s.gradientLevel3 = 256; }});
+    cases.push_back({"rectangle of height 0", 3, [](cStep4&) {}, [](cStep4& s) { s.gradientLevel3 = 40; }, {0, 100, 40, 40}});
+    cases.push_back({"no host", 3, [](cStep4&) {}, [](cStep4& s) { s.gradientLevel3 = 40; }, {0, 100, 0, 100}, true});
+    uint32_t seed = 11;
+    for (const Case& c : cases) {
+        SCOPED_TRACE(testing::Message() << c.what << " seed " << seed);
+        host.filterRect = c.filter;
+        cStep4 identity{nullptr, &host, nullptr, nullptr}, flat{nullptr, c.hostless ? nullptr : &host, nullptr, nullptr};
+        identity.mode = flat.mode = c.mode;
+        c.both(identity);
+        c.both(flat);
+        c.flat(flat);
+        expectSameOutput(flat, identity, seed++);
     }
 }
 

@@ -1,12 +1,15 @@
-// Settings the text can carry but the arithmetic of the steps was not made for: every parameter at
-// the ends of the int range, mode by mode, on samples that include the ends of the int range too,
-// and a settings text with every divisor at 0 run through the whole chain.
+// Settings that must change nothing, and settings the text can carry but the arithmetic of the steps
+// was not made for: every parameter at the ends of the int range, mode by mode, on samples that
+// include the ends of the int range too, and a settings text with every divisor at 0 run through the
+// whole chain.
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <functional>
 #include <iterator>
 #include <memory>
 #include <string>
+#include <typeinfo>
 #include <vector>
 
 #include "kernel/FilterAction.h"
@@ -50,6 +53,19 @@ Image extremePicture(uint32_t seed) {
 
 class StepExtremesTest : public StepTest {
 protected:
+    // A random picture through a step set up by `set` must come out as it went in.
+    template <class Step>
+    void expectUnchanged(int32_t mode, const std::function<void(Step&)>& set = {}, int32_t sampling = 1) {
+        SCOPED_TRACE(testing::Message() << typeid(Step).name() << " mode " << mode << " sampling " << sampling);
+        Step step{nullptr, &host, nullptr, nullptr};
+        step.mode = mode;
+        if (set) set(step);
+        Image img(24, 20, 0, 0, sampling);
+        img.fillRandom(uint32_t(mode) + 7);
+        auto src = sampling == 1 ? img.block(cRect{3, 21, 2, 18}) : img.block();
+        auto dst = runStep(step, src.get(), 2);
+        expectSamePixels(*src, *dst);
+    }
     // Each field alone at `value`, then all of them, for every mode; clampedModes must stay in range.
     template <class Step>
     void sweep(const std::vector<int32_t>& modes, const std::vector<int32_t>& clampedModes, int32_t border) {
@@ -84,6 +100,34 @@ protected:
 };
 
 }  // namespace
+
+TEST_F(StepExtremesTest, SettingsThatChangeNothingHandTheInputOn) {
+    // Copy modes and modes without a median.
+    for (int32_t mode : {0, 100, 101, 104, 107, 108, 5, 99, -1, kMin}) expectUnchanged<cStep1>(mode);
+    for (int32_t preset : {5, -1, kMax}) expectUnchanged<cStep1>(3, [=](cStep1& s) { s.preset3 = preset; });
+    // A chroma limit of 0 keeps the input; a percentage above 100 would give a negative limit that
+    // pushes the chroma away from the median, and is held at 0 too.
+    for (int32_t percent : {100, 101, 150, kMax})
+        expectUnchanged<cStep1>(2, [=](cStep1& s) { s.chromaLimitPercent = percent; });
+    // A median radius below one stored pixel.
+    for (int32_t radius : {0, -5, kMin}) expectUnchanged<cStep1>(1, [=](cStep1& s) { s.medianRadius1 = radius; });
+    expectUnchanged<cStep1>(1, [](cStep1& s) { s.medianRadius1 = 1; }, 2);
+    for (int32_t mode : {6, -1, 0, 100, kMin, kMax}) expectUnchanged<cStep3>(mode);
+    for (int32_t mode : {6, -1, 0, kMin, kMax}) expectUnchanged<cStep4>(mode);
+    // Modes 1 to 3 of step 4 at their defaults; mode 3 asks for the filter rectangle once.
+    for (int32_t mode : {1, 2, 3}) {
+        const int before = host.filterRectCalls;
+        expectUnchanged<cStep4>(mode);
+        EXPECT_EQ(host.filterRectCalls - before, mode == 3 ? 1 : 0);
+    }
+    // An empty processing rectangle.
+    Image img(16, 16);
+    img.fillRandom(4);
+    cStep1 step{nullptr, &host, nullptr, nullptr};
+    step.mode = 4;
+    auto src = img.block(cRect{5, 5, 7, 7});
+    expectSamePixels(*src, *runStep(step, src.get()));
+}
 
 TEST_F(StepExtremesTest, Step1EveryParameterAtTheEndsOfTheRange) {
     sweep<cStep1>({1, 2, 3, 4, 5, 100, 102, 105, 108, kMin, kMax}, {}, 10);
