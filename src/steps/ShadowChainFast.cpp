@@ -13,6 +13,14 @@
 
 using KERNEL::cPixelBlock;
 
+// Row kernels get an AVX2 clone chosen at load time. Clang cannot clone templates; there they
+// stay baseline.
+#if defined(__GNUC__) && !defined(__clang__)
+#define NOCTIVA_AVX2_CLONES __attribute__((target_clones("avx2", "default")))
+#else
+#define NOCTIVA_AVX2_CLONES
+#endif
+
 namespace {
 
 // blur(6.0): a 13-pixel box, twice along each axis; step 2 asks for 20 pixels around the core and
@@ -69,12 +77,12 @@ inline void boxLineT(const int32_t* __restrict ext, int32_t count, T* __restrict
         out[j] = T(boxMean(s));
     }
 }
-__attribute__((target_clones("avx2", "default"))) void boxLine(const int32_t* ext, int32_t count, int32_t* out) {
+NOCTIVA_AVX2_CLONES void boxLine(const int32_t* ext, int32_t count, int32_t* out) {
     boxLineT(ext, count, out);
 }
 // Means of host samples' Lab or RGB values lie in 0..65535 (a and b of host samples cannot reach
 // -1), so the tile's row-pass and column-pass results are kept in 16 bits: half the cache.
-__attribute__((target_clones("avx2", "default"))) void boxLine(const int32_t* ext, int32_t count, uint16_t* out) {
+NOCTIVA_AVX2_CLONES void boxLine(const int32_t* ext, int32_t count, uint16_t* out) {
     boxLineT(ext, count, out);
 }
 
@@ -179,15 +187,15 @@ inline void mixPixel(const S* p, const uint16_t* t, int64_t times, S* o) {
 // Row kernels for one sample type and pixel layout, compiled for AVX2 and for the baseline.
 template <class S, int CH>
 struct cKernels {
-    __attribute__((target_clones("avx2", "default"))) static void convertRgb(const S* in, int32_t ch, int32_t n,
+    NOCTIVA_AVX2_CLONES static void convertRgb(const S* in, int32_t ch, int32_t n,
                                                                            int32_t* out) {
         convertSpan<S, CH, false>(in, ch, n, out);
     }
-    __attribute__((target_clones("avx2", "default"))) static void convertLab(const S* in, int32_t ch, int32_t n,
+    NOCTIVA_AVX2_CLONES static void convertLab(const S* in, int32_t ch, int32_t n,
                                                                            int32_t* out) {
         convertSpan<S, CH, true>(in, ch, n, out);
     }
-    __attribute__((target_clones("avx2", "default"))) static void mix(const S* in, const uint16_t* blur, int32_t ch,
+    NOCTIVA_AVX2_CLONES static void mix(const S* in, const uint16_t* blur, int32_t ch,
                                                                     int32_t n, S* out) {
         mixSpan<S, CH>(in, blur, ch, n, out);
     }
@@ -211,7 +219,7 @@ struct cColumns {
 #if defined(__clang__)
 #define NOCTIVA_TEMPLATE_CLONES
 #else
-#define NOCTIVA_TEMPLATE_CLONES __attribute__((target_clones("avx2", "default")))
+#define NOCTIVA_TEMPLATE_CLONES NOCTIVA_AVX2_CLONES
 #endif
 template <size_t NW>
 NOCTIVA_TEMPLATE_CLONES void columnChunk(const cColumns& t, int32_t x0, size_t nRun,
