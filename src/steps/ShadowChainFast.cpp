@@ -29,7 +29,7 @@ constexpr int32_t kR = 6;
 constexpr int32_t kN = 2 * kR + 1;
 constexpr int32_t kStep2Border = 20;
 constexpr int32_t kLabBorder = 30;
-constexpr int32_t kColumnChunk = 16;  // columns per vertical sweep: its scratch stays in L1/L2
+constexpr int32_t kColumnChunk = 32;  // columns per vertical sweep: its scratch stays in L1/L2
 
 inline int32_t clampIndex(int64_t v, int32_t size) { return int32_t(v < 0 ? 0 : (v >= size ? size - 1 : v)); }
 
@@ -79,6 +79,10 @@ inline void boxLineT(const int32_t* __restrict ext, int32_t count, T* __restrict
 }
 NOCTIVA_AVX2_CLONES void boxLine(const int32_t* ext, int32_t count, int32_t* out) {
     boxLineT(ext, count, out);
+}
+// Input L of a Lab line's pixels [0, n).
+NOCTIVA_AVX2_CLONES void takeL(const int32_t* lab, int32_t n, uint16_t* out) {
+    for (int32_t i = 0; i < n; ++i) out[i] = uint16_t(lab[3 * i]);
 }
 // Means of host samples' Lab or RGB values lie in 0..65535 (a and b of host samples cannot reach
 // -1), so the tile's row-pass and column-pass results are kept in 16 bits: half the cache.
@@ -146,17 +150,16 @@ inline void convertSpan(const S* __restrict in, int32_t ch, int32_t n, int32_t* 
 }
 
 // The mix for `n` pixels of one core row, each taken once: L = (blurred L + 2 x input L) / 3, then
-// Lab back and the host's depth. The alpha sample, if any, is left as it is.
+// Lab back and the host's depth. `input` holds the input L the row phase computed. The alpha
+// sample, if any, is left as it is.
 template <class S, int CH>
-inline void mixSpan(const S* in, const uint16_t* __restrict blur, int32_t ch, int32_t n, S* out) {
+inline void mixSpan(const uint16_t* __restrict input, const uint16_t* __restrict blur, int32_t ch, int32_t n,
+                    S* __restrict out) {
     const int32_t step = CH != 0 ? CH : ch;
     for (int32_t i = 0; i < n; ++i) {
-        const S* p = in + size_t(i) * size_t(step);
         const uint16_t* t = blur + 3 * i;
-        const int32_t R0 = toWork<S>(p[0]), G0 = toWork<S>(p[1]), B0 = toWork<S>(p[2]);
-        const int32_t Ls = ((2 * R0 + 3 * G0 + B0) * 170) >> 10;
         // Both terms are >= 0: the unsigned division is the signed one and vectorises.
-        const int32_t L = int32_t(uint32_t(t[0] + 2 * Ls) / 3u);
+        const int32_t L = int32_t(uint32_t(t[0] + 2 * int32_t(input[i])) / 3u);
         int32_t R, G, B;
         toRGB32(L, t[1], t[2], R, G, B);
         S* o = out + size_t(i) * size_t(step);
@@ -195,7 +198,7 @@ struct cKernels {
                                                                            int32_t* out) {
         convertSpan<S, CH, true>(in, ch, n, out);
     }
-    NOCTIVA_AVX2_CLONES static void mix(const S* in, const uint16_t* blur, int32_t ch,
+    NOCTIVA_AVX2_CLONES static void mix(const uint16_t* in, const uint16_t* blur, int32_t ch,
                                                                     int32_t n, S* out) {
         mixSpan<S, CH>(in, blur, ch, n, out);
     }
@@ -324,6 +327,7 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
     const int32_t ch = int32_t(source.bytesPerPixel / sizeof(S));
     // `rows` holds the core's columns, row by row over the whole tile height.
     const size_t rowStride = size_t(h2i1 - h2i0) * 3;
+    uint16_t* const inputL = rows + rowStride * size_t(g.H);  // core rows by core columns
     const bool h1Special = h1.special(h1i0, h1i1), h2Special = h2.special(h2i0, h2i1);
     const bool v1Special = v1.special(v1i0, v1i1), v2Special = v2.special(v2i0, v2i1);
 
@@ -364,6 +368,9 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
             }
             replicate(e1, 0, s0 - p0, s0 - p0);
             replicate(e1, s1 - p0, p1 - p0, s1 - 1 - p0);
+            // The core lies inside the Lab stage's area: keep its input L for the mix.
+            if (y >= v2i0 && y < v2i1)
+                takeL(e1 + 3 * size_t(h2i0 - p0), h2i1 - h2i0, inputL + size_t(y - v2i0) * size_t(h2i1 - h2i0));
 
             int32_t* b1 = e2 + 3 * size_t(h1i0 - q0);
             boxLine(e1, h1i1 - h1i0, b1);
@@ -424,7 +431,8 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
                 // Edge pixels with another multiplicity go through the scalar mix, never both (the
                 // source and destination may be one buffer).
                 const int32_t a = colMultFirst != 1 ? 1 : 0, z = n > 1 && colMultLast != 1 ? n - 1 : n;
-                if (z > a) K::mix(in + size_t(a) * size_t(ch), blur + 3 * size_t(a), ch, z - a, out + size_t(a) * size_t(ch));
+                const uint16_t* ls = inputL + size_t(y - v2i0) * size_t(n);
+                if (z > a) K::mix(ls + a, blur + 3 * size_t(a), ch, z - a, out + size_t(a) * size_t(ch));
                 if (a == 1) mixPixel<S>(in, blur, colMultFirst, out);
                 if (z == n - 1)
                     mixPixel<S>(in + size_t(z) * size_t(ch), blur + 3 * size_t(z), colMultLast, out + size_t(z) * size_t(ch));
@@ -470,7 +478,8 @@ bool cDefaultChainTile::Accepts(const cPixelBlock& s, const cPixelBlock& d) {
 
 void cDefaultChainTile::Run(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorkerPool& pool) {
     if (lines.size() < size_t(pool.Threads())) lines.resize(size_t(pool.Threads()));
-    const uint64_t bytes = uint64_t(source.outerRect.width()) * uint64_t(source.outerRect.height()) * 3 * sizeof(uint16_t);
+    // Row-pass results (3 per pixel) and the core's input L (1 per pixel), at most the tile.
+    const uint64_t bytes = uint64_t(source.outerRect.width()) * uint64_t(source.outerRect.height()) * 4 * sizeof(uint16_t);
     if (!rowsMemory || rowsMemory->Size() < bytes) {
         rows = nullptr;
         rowsMemory.reset();
