@@ -29,6 +29,7 @@ struct Options {
     int width = 6000, height = 4000, runs = 5;
     std::vector<int> depths{8, 16};
     std::vector<std::string> threads{"1", "2"};
+    bool reference = true;  // also time NOCTIVA_REFERENCE=1 (one thread) and print the ratios
     std::string par1;
     std::string module = NOCTIVA_MODULE_PATH;
 };
@@ -105,8 +106,9 @@ std::map<std::string, double> readStages(const std::string& path) {
 void usage() {
     std::puts(
         "noctiva_bench_run [--width W] [--height H] [--runs N] [--depth 8|16|both] [--threads LIST]\n"
-        "                  [--par1 TEXT] [--module PATH]\n"
-        "  --threads: comma-separated NOCTIVA_THREADS values (default 1,2)");
+        "                  [--par1 TEXT] [--module PATH] [--no-reference]\n"
+        "  --threads: comma-separated NOCTIVA_THREADS values (default 1,2)\n"
+        "  the reference path (NOCTIVA_REFERENCE=1, one thread) is timed too unless --no-reference");
 }
 
 bool parse(int argc, char** argv, Options& o) {
@@ -121,6 +123,7 @@ bool parse(int argc, char** argv, Options& o) {
         else if (a == "--runs") o.runs = std::max(1, std::stoi(value()));
         else if (a == "--par1") o.par1 = value();
         else if (a == "--module") o.module = value();
+        else if (a == "--no-reference") o.reference = false;
         else if (a == "--depth") {
             const std::string d = value();
             o.depths = d == "both" ? std::vector<int>{8, 16} : std::vector<int>{std::stoi(d)};
@@ -156,8 +159,17 @@ int main(int argc, char** argv) {
     Image image(o.width, o.height, 3, 8);
     for (int depth : o.depths) {
         image.depth = depth;
-        for (const std::string& t : o.threads) {
+        std::vector<std::string> configurations = o.threads;
+        if (o.reference) configurations.insert(configurations.begin(), "reference");
+        double referenceMs = 0.0;
+        for (const std::string& configuration : configurations) {
+            const bool isReference = configuration == "reference";
+            const std::string t = isReference ? "1" : configuration;
             setenv("NOCTIVA_THREADS", t.c_str(), 1);
+            if (isReference)
+                setenv("NOCTIVA_REFERENCE", "1", 1);
+            else
+                unsetenv("NOCTIVA_REFERENCE");
             std::vector<double> times;
             std::map<std::string, std::vector<double>> stages;
             long tiles = 0;
@@ -179,8 +191,12 @@ int main(int argc, char** argv) {
                 for (const auto& [name, v] : readStages(stageFile)) stages[name].push_back(v);
             }
             const double ms = median(times);
-            std::printf("%2d-bit threads %-2s  filter %8.1f ms  %7.1f Mpix/s  (min %.1f ms)  tiles %ld\n", depth,
-                        t.c_str(), ms, mpix / (ms / 1000.0), *std::min_element(times.begin(), times.end()), tiles);
+            if (isReference) referenceMs = ms;
+            std::printf("%2d-bit %-10s  filter %8.1f ms  %7.1f Mpix/s  (min %.1f ms)  tiles %ld", depth,
+                        isReference ? "reference" : ("threads " + t).c_str(), ms, mpix / (ms / 1000.0),
+                        *std::min_element(times.begin(), times.end()), tiles);
+            if (!isReference && referenceMs > 0.0) std::printf("  %.2fx the reference", referenceMs / ms);
+            std::printf("\n");
             if (!stages.empty()) {
                 std::printf("    stages (median ms):");
                 for (const char* name : {"convertIn", "lab", "step2", "labBack", "convertOut", "rows", "columns", "mix", "apply"})
