@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cstdlib>
+#include <stdexcept>
 
 #if defined(__x86_64__) || defined(__i386__)
 #include <immintrin.h>
@@ -16,7 +17,7 @@ namespace {
 // Long enough to cover the gap between two phases of a tile, short against a tile's host copy.
 constexpr int kSpins = 1 << 10;
 
-// Unwinds the parts waiting in a barrier after another part failed.
+// Unwinds the participants after another one failed.
 struct cAborted {};
 
 // Spins until ready() or kSpins; true if ready.
@@ -39,24 +40,13 @@ int cWorkerPool::DefaultThreads() {
     return hw == 0 ? 1 : int(std::min(hw, 8u));
 }
 
-std::pair<int32_t, int32_t> cWorkerPool::cSection::share(int32_t count) const {
-    if (count <= 0) return {0, 0};
-    const int64_t b = int64_t(count) * part / parts, e = int64_t(count) * (part + 1) / parts;
-    return {int32_t(b), int32_t(e)};
-}
-
-void cWorkerPool::cSection::sync() {
-    if (parts > 1) pool.barrier();
-}
-
 cWorkerPool::cWorkerPool(int threads) {
     threads = std::clamp(threads, 1, 64);
     workers.reserve(size_t(threads - 1));
     try {
         for (int i = 1; i < threads; ++i) workers.emplace_back([this, i] { workerLoop(i); });
     } catch (...) {
-        // Fewer workers than asked is still a working pool; workers started so far wait for a
-        // generation that counts them.
+        // Fewer workers than asked is still a working pool.
     }
 }
 
@@ -69,38 +59,40 @@ cWorkerPool::~cWorkerPool() {
     for (std::thread& t : workers) t.join();
 }
 
-void cWorkerPool::barrier() {
+int32_t cWorkerPool::claim(int phase, int32_t grain) {
+    if (phase >= kMaxPhases) throw std::logic_error("worker pool: too many phases in one section");
     if (broken.load(std::memory_order_acquire)) throw cAborted{};
-    const uint64_t gen = barrierGeneration.load(std::memory_order_acquire);
-    if (arrived.fetch_add(1, std::memory_order_acq_rel) + 1 == Threads()) {
-        arrived.store(0, std::memory_order_relaxed);
-        {
-            std::lock_guard<std::mutex> lock(mutex);
-            barrierGeneration.fetch_add(1, std::memory_order_acq_rel);
-        }
-        barrierWake.notify_all();
-        return;
+    return phases[phase].next.fetch_add(grain, std::memory_order_relaxed);
+}
+
+void cWorkerPool::complete(int phase, int32_t items, int32_t count) {
+    if (phases[phase].done.fetch_add(items, std::memory_order_acq_rel) + items == count) {
+        std::lock_guard<std::mutex> lock(mutex);
+        phaseDone.notify_all();
     }
-    auto released = [&] {
-        return barrierGeneration.load(std::memory_order_acquire) != gen || broken.load(std::memory_order_acquire);
+}
+
+void cWorkerPool::awaitPhase(int phase, int32_t count) {
+    auto finished = [&] {
+        return phases[phase].done.load(std::memory_order_acquire) >= count || broken.load(std::memory_order_acquire);
     };
-    if (!spinFor(released)) {
+    if (!spinFor(finished)) {
         std::unique_lock<std::mutex> lock(mutex);
-        barrierWake.wait(lock, released);
+        phaseDone.wait(lock, finished);
     }
-    if (barrierGeneration.load(std::memory_order_acquire) == gen) throw cAborted{};
+    if (phases[phase].done.load(std::memory_order_acquire) < count) throw cAborted{};
 }
 
 void cWorkerPool::runPart(int index) {
     try {
-        cSection section(*this, index, Threads());
+        cSection section(*this, index);
         (*job)(section);
     } catch (const cAborted&) {
     } catch (...) {
         std::lock_guard<std::mutex> lock(mutex);
         if (!failure) failure = std::current_exception();
         broken.store(true, std::memory_order_release);
-        barrierWake.notify_all();
+        phaseDone.notify_all();
     }
 }
 
@@ -112,37 +104,53 @@ void cWorkerPool::workerLoop(int index) {
             std::unique_lock<std::mutex> lock(mutex);
             wake.wait(lock, posted);
         }
-        if (stopping.load()) return;
-        seen = generation.load(std::memory_order_acquire);
-        runPart(index);
-        if (pending.fetch_sub(1, std::memory_order_acq_rel) == 1) {
+        bool joined = false;
+        {
             std::lock_guard<std::mutex> lock(mutex);
-            done.notify_one();
+            if (stopping.load()) return;
+            seen = generation.load(std::memory_order_acquire);
+            if (open) {
+                joined = true;
+                active.fetch_add(1, std::memory_order_relaxed);
+            }
+        }
+        if (!joined) continue;
+        runPart(index);
+        if (active.fetch_sub(1, std::memory_order_acq_rel) == 1) {
+            std::lock_guard<std::mutex> lock(mutex);
+            left.notify_one();
         }
     }
 }
 
 void cWorkerPool::parallelSection(const Section& fn) {
-    if (workers.empty()) {
-        cSection section(*this, 0, 1);
-        fn(section);
-        return;
+    for (cPhase& p : phases) {
+        p.next.store(0, std::memory_order_relaxed);
+        p.done.store(0, std::memory_order_relaxed);
     }
-    failure = nullptr;
     broken.store(false, std::memory_order_relaxed);
-    arrived.store(0, std::memory_order_relaxed);
-    pending.store(int(workers.size()), std::memory_order_relaxed);
-    {
-        std::lock_guard<std::mutex> lock(mutex);
+    failure = nullptr;
+    if (workers.empty()) {
         job = &fn;
-        generation.fetch_add(1, std::memory_order_acq_rel);
-    }
-    wake.notify_all();
-    runPart(0);
-    auto finished = [&] { return pending.load(std::memory_order_acquire) == 0; };
-    if (!spinFor(finished)) {
-        std::unique_lock<std::mutex> lock(mutex);
-        done.wait(lock, finished);
+        runPart(0);
+    } else {
+        {
+            std::lock_guard<std::mutex> lock(mutex);
+            job = &fn;
+            open = true;
+            generation.fetch_add(1, std::memory_order_acq_rel);
+        }
+        wake.notify_all();
+        runPart(0);
+        {
+            std::lock_guard<std::mutex> lock(mutex);
+            open = false;
+        }
+        auto empty = [&] { return active.load(std::memory_order_acquire) == 0; };
+        if (!spinFor(empty)) {
+            std::unique_lock<std::mutex> lock(mutex);
+            left.wait(lock, empty);
+        }
     }
     job = nullptr;
     std::exception_ptr error = failure;
@@ -150,16 +158,9 @@ void cWorkerPool::parallelSection(const Section& fn) {
     if (error) std::rethrow_exception(error);
 }
 
-void cWorkerPool::parallelFor(int32_t count, const Job& fn) {
+void cWorkerPool::parallelFor(int32_t count, const Job& fn, int32_t grain) {
     if (count <= 0) return;
-    if (workers.empty() || count == 1) {
-        fn(0, 0, count);
-        return;
-    }
-    parallelSection([&](cSection& s) {
-        const auto [b, e] = s.share(count);
-        if (b < e) fn(s.part, b, e);
-    });
+    parallelSection([&](cSection& s) { s.phase(count, grain, fn, false); });
 }
 
 }  // namespace KERNEL

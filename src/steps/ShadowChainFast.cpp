@@ -446,18 +446,17 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
         }
     };
 
-    // One section per tile, a barrier between the phases; part 0 times them.
+    // One section per tile: each phase waits for the previous one's last grain; the calling thread
+    // (part 0) times them.
     pool.parallelSection([&](KERNEL::cWorkerPool::cSection& s) {
-        auto phase = [&](KERNEL::timing::Stage stage, int32_t count, const auto& body, bool last) {
+        auto phase = [&](KERNEL::timing::Stage stage, int32_t count, int32_t grain, const auto& body, bool last) {
             std::optional<KERNEL::timing::cStageClock> clock;
             if (s.part == 0) clock.emplace(stage);
-            const auto [b, e] = s.share(count);
-            if (b < e) body(s.part, b, e);
-            if (!last) s.sync();
+            s.phase(count, grain, body, !last);
         };
-        phase(KERNEL::timing::kFastRows, r1 - r0, rowsPart, false);
-        phase(KERNEL::timing::kFastColumns, chunks, columnsPart, false);
-        phase(KERNEL::timing::kFastMix, v2i1 - v2i0, mixPart, true);
+        phase(KERNEL::timing::kFastRows, r1 - r0, 8, rowsPart, false);
+        phase(KERNEL::timing::kFastColumns, chunks, 1, columnsPart, false);
+        phase(KERNEL::timing::kFastMix, v2i1 - v2i0, 16, mixPart, true);
     });
 }
 
