@@ -8,6 +8,7 @@ packages=(
   libpng-dev libtiff-dev libcli11-dev
   xvfb xauth xdotool imagemagick binutils
   gimp libgimp2.0-dev libgtk-3-dev
+  clang-14 libclang-rt-14-dev
 )
 missing=()
 for p in "${packages[@]}"; do
