@@ -30,8 +30,14 @@ void abandonRun(cFilter* filter) noexcept {
 
 }  // namespace
 
-extern "C" __attribute__((visibility("default"))) void ENTRYPOINT(pi::int16 selector, pi::FilterRecord* filterRecord,
-                                                                  intptr_t* data, pi::int16* result) {
+#ifdef _WIN32
+#define NOCTIVA_EXPORT  // Noctiva.def names the one export
+#else
+#define NOCTIVA_EXPORT __attribute__((visibility("default")))
+#endif
+
+extern "C" NOCTIVA_EXPORT void ENTRYPOINT(pi::int16 selector, pi::FilterRecord* filterRecord,
+                                          intptr_t* data, pi::int16* result) {
     if (selector == pi::filterSelectorAbout) return;
     if (filterRecord == nullptr || data == nullptr || result == nullptr) return;
     plugin::gFilterRecord = filterRecord;
