@@ -6,6 +6,10 @@
 #include "Presets.h"
 #include "noctiva/host/Error.h"
 
+#ifdef _WIN32
+#include <windows.h>
+#endif
+
 namespace noctiva::cli {
 
 namespace {
@@ -97,9 +101,16 @@ host::Selection parseRectangle(const std::string& text, const std::string& what)
 
 std::filesystem::path modulePathFrom(const std::string& given) {
     if (!given.empty()) return given;
+#ifdef _WIN32
+    wchar_t self[32768];
+    const DWORD length = GetModuleFileNameW(nullptr, self, DWORD(std::size(self)));
+    const bool found = length > 0 && length < std::size(self);
+    return (found ? std::filesystem::path(self).parent_path() : std::filesystem::current_path()) / "Noctiva.8bf";
+#else
     std::error_code ec;
     const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", ec);
     return (ec ? std::filesystem::current_path() : self.parent_path()) / "Noctiva.so";
+#endif
 }
 
 CompareLayout parseCompareLayout(const std::string& text) {

@@ -9,9 +9,32 @@
 #include "Settings.h"
 #include "noctiva/host/Error.h"
 
+#ifdef _WIN32
+#include <windows.h>
+
+#include <cstdio>
+#endif
+
 using namespace noctiva::cli;
 
+#ifdef _WIN32
+namespace {
+// A module that crashes must fail the run with a message, never leave a dialog waiting for a click.
+LONG WINAPI reportCrash(EXCEPTION_POINTERS* e) {
+    std::fprintf(stderr, "noctiva: crashed with exception 0x%08lX\n",
+                 static_cast<unsigned long>(e->ExceptionRecord->ExceptionCode));
+    std::fflush(stderr);
+    TerminateProcess(GetCurrentProcess(), 3);
+    return EXCEPTION_EXECUTE_HANDLER;
+}
+}  // namespace
+#endif
+
 int main(int argc, char** argv) {
+#ifdef _WIN32
+    SetErrorMode(SEM_FAILCRITICALERRORS | SEM_NOGPFAULTERRORBOX);
+    SetUnhandledExceptionFilter(reportCrash);
+#endif
     CLI::App app{"Runs the Noctiva filter module over images (PNG or TIFF, 8 or 16 bits, RGB or RGBA)."};
     app.name("noctiva");
     CommandOptions options;

@@ -3,8 +3,13 @@
 #include <fcntl.h>
 #include <sys/stat.h>
 #include <unistd.h>
+#ifdef _WIN32
+#include <io.h>
+#include <windows.h>
+#endif
 
 #include <algorithm>
+#include <cctype>
 #include <cerrno>
 #include <cstring>
 #include <memory>
@@ -37,6 +42,9 @@ public:
         const fs::path folder = target.has_parent_path() ? target.parent_path() : fs::path(".");
         std::string pattern = (folder / ("." + target.filename().string() + ".XXXXXX")).string();
         fd_ = ::mkstemp(pattern.data());
+#ifdef _WIN32
+        if (fd_ >= 0) _setmode(fd_, _O_BINARY);
+#endif
         if (fd_ < 0) throw HostError(target.string(), std::string("cannot create file: ") + std::strerror(errno));
         path_ = pattern;
     }
@@ -49,9 +57,15 @@ public:
 
     int release() { return std::exchange(fd_, -1); }  // the writer closes it
     void commit() {
+#ifdef _WIN32
+        // rename() does not replace an existing file on Windows.
+        if (!MoveFileExW(fs::path(path_).c_str(), target_.c_str(), MOVEFILE_REPLACE_EXISTING))
+            throw HostError(target_.string(), "cannot write file: error " + std::to_string(GetLastError()));
+#else
         ::chmod(path_.c_str(), 0644);
         if (std::rename(path_.c_str(), target_.c_str()) != 0)
             throw HostError(target_.string(), std::string("cannot write file: ") + std::strerror(errno));
+#endif
         committed_ = true;
     }
 
@@ -75,6 +89,10 @@ bool formatFromExtension(const fs::path& path, FileFormat& format) {
         format = FileFormat::Tiff;
         return true;
     }
+    if (ext == ".pam") {
+        format = FileFormat::Pam;
+        return true;
+    }
     return false;
 }
 
@@ -93,8 +111,12 @@ LoadedImage loadImage(const fs::path& path) {
     const bool isPng = got == 8 && std::memcmp(magic, pngMagic, 8) == 0;
     const bool isTiff = got >= 4 && ((magic[0] == 'I' && magic[1] == 'I' && (magic[2] == 42 || magic[2] == 43) && magic[3] == 0) ||
                                      (magic[0] == 'M' && magic[1] == 'M' && magic[2] == 0 && (magic[3] == 42 || magic[3] == 43)));
+    const bool isPam = got >= 3 && magic[0] == 'P' && magic[1] == '7' && std::isspace(magic[2]);
     LoadedImage loaded;
-    if (isPng) {
+    if (isPam) {
+        loaded.format = FileFormat::Pam;
+        loaded.image = detail::readPam(file.get(), name);
+    } else if (isPng) {
         loaded.format = FileFormat::Png;
         loaded.image = detail::readPng(file.get(), name);
     } else if (isTiff) {
@@ -102,7 +124,7 @@ LoadedImage loadImage(const fs::path& path) {
         loaded.format = FileFormat::Tiff;
         loaded.image = detail::readTiff(name);
     } else {
-        throw HostError(name, "not a PNG or TIFF file");
+        throw HostError(name, "not a PNG or TIFF file (nor a PAM file)");
     }
     checkExtent(loaded.image, name);
     if (loaded.image.depth == 16) {
@@ -141,10 +163,16 @@ void saveImage(const fs::path& path, const Image& image, FileFormat format, cons
     }
 
     TemporaryFile temporary(path);
-    if (format == FileFormat::Png)
+    if (format == FileFormat::Pam) {
+        const int fd = temporary.release();
+        std::FILE* file = ::fdopen(fd, "wb");
+        if (file == nullptr) ::close(fd);
+        detail::writePam(file, name, *toWrite);
+    } else if (format == FileFormat::Png) {
         detail::writePng(temporary.release(), name, *toWrite);
-    else
+    } else {
         detail::writeTiff(temporary.release(), name, *toWrite);
+    }
     temporary.commit();
 }
 

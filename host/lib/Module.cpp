@@ -1,6 +1,10 @@
 #include "noctiva/host/Module.h"
 
+#ifdef _WIN32
+#include <windows.h>
+#else
 #include <dlfcn.h>
+#endif
 
 #include <utility>
 
@@ -9,15 +13,27 @@
 namespace noctiva::host {
 
 namespace {
+#ifdef _WIN32
+std::string lastDlError(const char*) { return "error " + std::to_string(GetLastError()); }
+void* dlopen(const std::filesystem::path& path) { return LoadLibraryW(path.c_str()); }
+void* dlsym(void* library, const char* name) {
+    return reinterpret_cast<void*>(GetProcAddress(static_cast<HMODULE>(library), name));
+}
+void dlclose(void* library) { FreeLibrary(static_cast<HMODULE>(library)); }
+#else
 std::string lastDlError(const char* fallback) {
     const char* e = dlerror();
     return e ? e : fallback;
 }
+void* dlopen(const std::filesystem::path& path) { return ::dlopen(path.c_str(), RTLD_NOW | RTLD_LOCAL); }
+#endif
 }  // namespace
 
 Module::Module(const std::filesystem::path& path, const std::string& entryName) : path_(path) {
+#ifndef _WIN32
     dlerror();
-    library_ = dlopen(path.c_str(), RTLD_NOW | RTLD_LOCAL);
+#endif
+    library_ = dlopen(path);
     if (!library_) throw HostError(path.string(), "cannot load module: " + lastDlError("unknown error"));
     void* symbol = dlsym(library_, entryName.c_str());
     if (!symbol) {

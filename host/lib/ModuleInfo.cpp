@@ -6,7 +6,13 @@
 #include <cstring>
 #include <stdexcept>
 
+#ifndef _WIN32
 #include "ElfSections.h"
+#endif
+
+#ifdef _WIN32
+#include <windows.h>
+#endif
 
 namespace noctiva::host {
 
@@ -313,6 +319,55 @@ ModuleInfo parseModuleResources(const std::string& subject, std::span<const std:
     }
 }
 
+#ifdef _WIN32
+namespace {
+
+// The module mapped as data only: nothing of it runs.
+struct ResourceImage {
+    HMODULE module;
+    explicit ResourceImage(const std::filesystem::path& path)
+        : module(LoadLibraryExW(path.c_str(), nullptr, LOAD_LIBRARY_AS_DATAFILE | LOAD_LIBRARY_AS_IMAGE_RESOURCE)) {}
+    ~ResourceImage() {
+        if (module) FreeLibrary(module);
+    }
+    ResourceImage(const ResourceImage&) = delete;
+    ResourceImage& operator=(const ResourceImage&) = delete;
+
+    std::optional<std::span<const std::uint8_t>> find(const wchar_t* type, LPCWSTR id) const {
+        HRSRC info = FindResourceW(module, id, type);
+        if (!info) return std::nullopt;
+        HGLOBAL loaded = LoadResource(module, info);
+        const void* bytes = loaded ? LockResource(loaded) : nullptr;
+        if (!bytes) return std::nullopt;
+        return std::span<const std::uint8_t>(static_cast<const std::uint8_t*>(bytes), SizeofResource(module, info));
+    }
+};
+
+BOOL CALLBACK firstName(HMODULE, LPCWSTR, LPWSTR name, LONG_PTR out) {
+    // Only numeric IDs: a string name would need copying, and filters use numbers.
+    if (!IS_INTRESOURCE(name)) return TRUE;
+    *reinterpret_cast<std::optional<WORD>*>(out) = WORD(reinterpret_cast<ULONG_PTR>(name));
+    return FALSE;
+}
+
+}  // namespace
+
+ModuleInfo readModuleInfo(const std::filesystem::path& path) {
+    const ResourceImage image(path);
+    if (!image.module)
+        throw HostError(path.string(), "cannot read module resources: error " + std::to_string(GetLastError()));
+    // The first PIPL; a module with several menu entries has one per entry.
+    std::optional<WORD> piplId;
+    EnumResourceNamesW(image.module, L"PIPL", firstName, reinterpret_cast<LONG_PTR>(&piplId));
+    const auto pipl = piplId ? image.find(L"PIPL", MAKEINTRESOURCEW(*piplId)) : std::nullopt;
+    if (!pipl) throw HostError(path.string(), "no PIPL resource: not a filter module for this host");
+    // The AETE is the one the PIPL's terminology names.
+    const ModuleInfo bare = parseModuleResources(path.string(), *pipl, std::nullopt);
+    std::optional<std::span<const std::uint8_t>> aete;
+    if (bare.terminology) aete = image.find(L"AETE", MAKEINTRESOURCEW(WORD(bare.terminology->terminologyId)));
+    return parseModuleResources(path.string(), *pipl, aete);
+}
+#else
 ModuleInfo readModuleInfo(const std::filesystem::path& path) {
     auto sections = readElfSections(path, {"PIPL", "AETE"});
     if (!sections[0]) throw HostError(path.string(), "no PIPL resource: not a filter module for this host");
@@ -320,6 +375,7 @@ ModuleInfo readModuleInfo(const std::filesystem::path& path) {
     if (sections[1]) aete = std::span<const std::uint8_t>(*sections[1]);
     return parseModuleResources(path.string(), *sections[0], aete);
 }
+#endif
 
 std::optional<HostError> checkImageSupported(const ModuleInfo& info, pi::int16 imageMode, int depth) {
     if (info.supportsMode(imageMode, depth)) return std::nullopt;

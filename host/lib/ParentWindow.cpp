@@ -1,12 +1,19 @@
 #include "noctiva/host/ParentWindow.h"
 
+#ifndef _WIN32
 #include <dlfcn.h>
+#endif
 
 #include <cstdlib>
 #include <utility>
 
 namespace noctiva::host {
 
+#ifdef _WIN32
+// Not yet on Windows: the module gets no parent window (hwnd 0).
+ParentWindow ParentWindow::open() { return ParentWindow(); }
+void ParentWindow::close() noexcept {}
+#else
 namespace {
 
 // The few Xlib calls we need, resolved once. The library stays loaded for the life of the
@@ -78,6 +85,7 @@ void ParentWindow::close() noexcept {
     display_ = nullptr;
     window_ = 0;
 }
+#endif
 
 ParentWindow::~ParentWindow() { close(); }
 

@@ -1,4 +1,4 @@
-// PNG and TIFF files, 8 or 16 bits per channel, RGB or RGBA.
+// PNG, TIFF and PAM files, 8 or 16 bits per channel, RGB or RGBA (the Windows host: PAM only).
 //
 // A 16-bit file keeps its original samples beside the host image. On output, every sample whose
 // host value still equals the value it was loaded as is written with its original file value, so
@@ -13,7 +13,7 @@
 
 namespace noctiva::host {
 
-enum class FileFormat { Png, Tiff };
+enum class FileFormat { Png, Tiff, Pam };
 
 struct LoadedImage {
     Image image;
@@ -29,7 +29,7 @@ LoadedImage loadImage(const std::filesystem::path& path);
 void saveImage(const std::filesystem::path& path, const Image& image, FileFormat format,
                const LoadedImage* source = nullptr);
 
-// Format from the file name: ".png", ".tif", ".tiff" (any case). Returns false for anything else.
+// Format from the file name: ".png", ".tif", ".tiff", ".pam" (any case). Returns false for anything else.
 bool formatFromExtension(const std::filesystem::path& path, FileFormat& format);
 
 // The file samples to write for a 16-bit image (see above). Exposed for the tests.
