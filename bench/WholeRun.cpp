@@ -199,7 +199,7 @@ int main(int argc, char** argv) {
             std::printf("\n");
             if (!stages.empty()) {
                 std::printf("    stages (median ms):");
-                for (const char* name : {"convertIn", "lab", "step2", "labBack", "convertOut", "rows", "columns", "mix", "apply"})
+                for (const char* name : {"convertIn", "lab", "step2", "labBack", "convertOut", "rows", "columns", "mix", "poolWake", "poolEnd", "apply"})
                     if (stages.count(name)) std::printf(" %s %.1f", name, median(stages[name]));
                 if (stages.count("apply")) std::printf("  host+rest %.1f", ms - median(stages["apply"]));
                 std::printf("\n");

@@ -11,7 +11,7 @@ std::string gPath;
 std::chrono::steady_clock::duration gTotals[kStageCount]{};
 int32_t gTiles = 0;
 constexpr const char* kNames[kStageCount] = {"convertIn", "lab",  "step2",   "labBack",
-                                                    "convertOut", "rows", "columns", "mix", "apply"};
+                                                    "convertOut", "rows", "columns", "mix", "poolWake", "poolEnd", "apply"};
 }  // namespace
 
 void begin() {

@@ -8,8 +8,9 @@
 namespace KERNEL::timing {
 
 // The fused default-chain path reports its three phases: rows (host samples in, Lab, the row
-// passes), columns (the column passes) and mix (the mix, Lab back, host samples out).
-enum Stage : int { kConvertIn, kLab, kStep2, kLabBack, kConvertOut, kFastRows, kFastColumns, kFastMix, kApply, kStageCount };
+// passes), columns (the column passes) and mix (the mix, Lab back, host samples out); the worker
+// pool reports waking its workers and waiting for them to leave a section.
+enum Stage : int { kConvertIn, kLab, kStep2, kLabBack, kConvertOut, kFastRows, kFastColumns, kFastMix, kPoolWake, kPoolEnd, kApply, kStageCount };
 
 // Reads the environment and clears the totals; the filter calls it when a run starts.
 void begin();

@@ -1,5 +1,7 @@
 #include "kernel/WorkerPool.h"
 
+#include "kernel/StageTimer.h"
+
 #include <algorithm>
 #include <cstdlib>
 #include <stdexcept>
@@ -135,13 +137,17 @@ void cWorkerPool::parallelSection(const Section& fn) {
         runPart(0);
     } else {
         {
-            std::lock_guard<std::mutex> lock(mutex);
-            job = &fn;
-            open = true;
-            generation.fetch_add(1, std::memory_order_acq_rel);
+            timing::cStageClock clock(timing::kPoolWake);
+            {
+                std::lock_guard<std::mutex> lock(mutex);
+                job = &fn;
+                open = true;
+                generation.fetch_add(1, std::memory_order_acq_rel);
+            }
+            wake.notify_all();
         }
-        wake.notify_all();
         runPart(0);
+        timing::cStageClock clock(timing::kPoolEnd);
         {
             std::lock_guard<std::mutex> lock(mutex);
             open = false;
