@@ -63,6 +63,15 @@ if [ ! -f "$WINEPREFIX/system.reg" ]; then
 fi
 trap 'wineserver -k >/dev/null 2>&1 || true' EXIT
 
+# What the Windows host reads from the module's resources, against the Linux host reading the sections.
+"$linux/host/noctiva" info "$linux/host/Noctiva.so" | tail -n +2 >"$work/info.linux"
+(cd "$win/host" && timeout 120 wine noctiva.exe info Noctiva.8bf) | tr -d '\r' | tail -n +2 >"$work/info.win" || true
+if [ -s "$work/info.win" ] && cmp -s "$work/info.linux" "$work/info.win"; then
+    pass "info: the module's PIPL and AETE read through FindResource match the Linux reading"
+else
+    fail "info differs: $(diff "$work/info.linux" "$work/info.win" | head -5)"
+fi
+
 python3 "$root/tests/windows/make_inputs.py" "$root/samples/noisy-sample.png" "$work/sample8.pam" "$work/sample16.pam"
 every_step=(--set step1.mode=2 --set step2.mode=5 --set step3.mode=2 --set step3.saturationPercent=130
             --set step4.mode=2 --set step4.curveStrength2=40)
@@ -113,6 +122,18 @@ elif grep -q "nowhere.8bf: " "$work/missing.err"; then
     pass "a missing module fails the run: $(head -1 "$work/missing.err")"
 else
     fail "a missing module fails without naming it: $(head -1 "$work/missing.err")"
+fi
+
+# A module that faults: the unhandled-exception filter reports it and the run ends with status 3.
+(cd "$win/src/plugin" && x86_64-w64-mingw32-windres Noctiva.rc -O coff -o "$work/crash-res.o")
+x86_64-w64-mingw32-g++-posix -std=c++20 -O1 -shared -static -o "$work/Crash.8bf" \
+    "$root/tests/windows/CrashModule.cpp" "$work/crash-res.o"
+status=0
+(cd "$work" && timeout 120 wine "$win/host/noctiva.exe" sample16.pam -o crash.pam --module Crash.8bf) 2>"$work/crash.err" || status=$?
+if [ "$status" -eq 3 ] && grep -q "crashed with exception 0xC0000005" "$work/crash.err"; then
+    pass "a faulting module ends the run with status 3 and a message"
+else
+    fail "a faulting module: status $status, $(head -2 "$work/crash.err")"
 fi
 
 echo "$passed passed, $failures failed"

@@ -14,6 +14,12 @@ namespace noctiva::cli {
 
 namespace {
 
+#ifdef _WIN32
+constexpr const char* kModuleFile = "Noctiva.8bf";
+#else
+constexpr const char* kModuleFile = "Noctiva.so";
+#endif
+
 std::string readTextFile(const std::string& path) {
     std::ifstream in(path, std::ios::binary);
     if (!in) throw host::HostError(path, "cannot read file");
@@ -44,7 +50,8 @@ CLI::App* defineOptions(CLI::App& app, CommandOptions& o) {
                    "output image (.png, .tif, .tiff; no extension: the input's format), or a folder for several inputs")
         ->option_text("OUT");
     app.add_flag("--in-place", o.inPlace, "overwrite each input with its result (instead of -o)");
-    app.add_option("--module", o.module, "filter module (default: Noctiva.so beside this program)")
+    app.add_option("--module", o.module,
+                   std::string("filter module (default: ") + kModuleFile + " beside this program)")
         ->option_text("PATH");
     app.add_option("--selection", o.selection, "filter only the rectangle X,Y,W,H (default: the whole image)")
         ->option_text("X,Y,W,H");
@@ -84,7 +91,8 @@ CLI::App* defineOptions(CLI::App& app, CommandOptions& o) {
     app.add_flag("--list-presets", o.listPresets, "print the presets and what they change, and exit");
 
     CLI::App* info = app.add_subcommand("info", "print what a module file declares (PIPL and AETE) and exit");
-    info->add_option("module", o.infoModule, "module file (default: Noctiva.so beside this program)");
+    info->add_option("module", o.infoModule,
+                     std::string("module file (default: ") + kModuleFile + " beside this program)");
     return info;
 }
 
@@ -105,11 +113,11 @@ std::filesystem::path modulePathFrom(const std::string& given) {
     wchar_t self[32768];
     const DWORD length = GetModuleFileNameW(nullptr, self, DWORD(std::size(self)));
     const bool found = length > 0 && length < std::size(self);
-    return (found ? std::filesystem::path(self).parent_path() : std::filesystem::current_path()) / "Noctiva.8bf";
+    return (found ? std::filesystem::path(self).parent_path() : std::filesystem::current_path()) / kModuleFile;
 #else
     std::error_code ec;
     const std::filesystem::path self = std::filesystem::read_symlink("/proc/self/exe", ec);
-    return (ec ? std::filesystem::current_path() : self.parent_path()) / "Noctiva.so";
+    return (ec ? std::filesystem::current_path() : self.parent_path()) / kModuleFile;
 #endif
 }
 
