@@ -6,6 +6,11 @@
 #include <cstdlib>
 #include <stdexcept>
 
+#if defined(__linux__)
+#include <pthread.h>
+#include <sched.h>
+#endif
+
 #if defined(__x86_64__) || defined(__i386__)
 #include <immintrin.h>
 #define NOCTIVA_PAUSE() _mm_pause()
@@ -99,6 +104,14 @@ void cWorkerPool::runPart(int index) {
 }
 
 void cWorkerPool::workerLoop(int index) {
+#if defined(__linux__)
+    // A woken worker must not preempt the thread that woke it (the host's thread, which runs its
+    // own share of the section): batch threads get no wake-up preference. Failure leaves the
+    // default policy.
+    sched_param param{};
+    param.sched_priority = 0;
+    pthread_setschedparam(pthread_self(), SCHED_BATCH, &param);
+#endif
     uint64_t seen = 0;
     for (;;) {
         auto posted = [&] { return generation.load(std::memory_order_acquire) != seen || stopping.load(); };
