@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <cstring>
 #include <ctime>
+#include <new>
 #include <string>
 #include <vector>
 
@@ -254,6 +255,7 @@ void cFilter::ReadDescriptor() {
     if (token == nullptr) return;
     pi::uint32 key = 0, type = 0;
     pi::int32 flags = 0;
+    bool textLost = false;
     while (rp->getKeyProc(token, &key, &type, &flags)) {
         if (key == pi::keyDRes) {
             pi::int32 value = 0;
@@ -261,16 +263,21 @@ void cFilter::ReadDescriptor() {
             dialogFlag = value == 3 ? 1 : 0;
         } else if (key == pi::keyPar1) {
             pi::Handle text = nullptr;
-            rp->getTextProc(token, &text);
+            const pi::OSErr error = rp->getTextProc(token, &text);
             const pi::HandleProcs* procs = handleSuite();
             if (text != nullptr && procs != nullptr) {
                 std::string copy = readTextHandle(procs, text);
                 procs->disposeProc(text);
                 SetParameterText(copy.data());
+            } else if (error == pi::memFullErr) {
+                // Running on the defaults instead of the given settings would pass for success.
+                textLost = true;
+                break;
             }
         }
     }
     rp->closeReadDescriptorProc(token);
+    if (textLost) throw std::bad_alloc();
 }
 
 void cFilter::WriteDescriptor() {
@@ -287,6 +294,7 @@ void cFilter::WriteDescriptor() {
     pi::PIWriteDescriptor token = wp->openWriteDescriptorProc();
     if (token == nullptr) return;
     const std::size_t length = strnlen(buffer.data(), buffer.size() - 1);
+    bool recorded = false;
     if (pi::Handle text = procs->newProc(int32_t(length + 1)); text != nullptr) {
         if (char* p = procs->lockProc(text, true); p != nullptr) {
             std::memcpy(p, buffer.data(), length);
@@ -294,6 +302,7 @@ void cFilter::WriteDescriptor() {
             procs->unlockProc(text);
             // The host takes the handle over with the descriptor.
             wp->putTextProc(token, pi::keyPar1, text);
+            recorded = true;
         } else {
             procs->disposeProc(text);
         }
@@ -301,6 +310,8 @@ void cFilter::WriteDescriptor() {
     pi::Handle descriptor = nullptr;
     wp->closeWriteDescriptorProc(token, &descriptor);
     dp->descriptor = descriptor;
+    // A run whose settings could not be recorded cannot be played back: not a success.
+    if (!recorded) *gResult = pi::memFullErr;
 }
 
 void cFilter::SetParameterText(char* text) {
