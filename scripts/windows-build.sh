@@ -19,9 +19,11 @@ step "dependencies" bash "$root/scripts/windows-deps.sh"
 mkdir -p "$build"
 step "layout check" "$cxx" -std=c++20 -Wall -Wextra -Werror -I"$root/src" -c \
     "$root/tests/windows/LayoutCheck.cpp" -o "$build/LayoutCheck.o"
-step "configure" cmake -S "$root" -B "$build" -DCMAKE_TOOLCHAIN_FILE="$root/cmake/mingw-w64.cmake" \
-    -DCMAKE_BUILD_TYPE=Release -DNOCTIVA_WITH_UI=OFF -DNOCTIVA_BUILD_TESTS=OFF -DNOCTIVA_BUILD_BENCH=OFF \
-    -DNOCTIVA_BUILD_GIMP=OFF >/dev/null
+configure() {
+    cmake -S "$root" -B "$build" -DCMAKE_TOOLCHAIN_FILE="$root/cmake/mingw-w64.cmake" -DCMAKE_BUILD_TYPE=Release \
+        -DNOCTIVA_WITH_UI=OFF -DNOCTIVA_BUILD_TESTS=OFF -DNOCTIVA_BUILD_BENCH=OFF -DNOCTIVA_BUILD_GIMP=OFF >/dev/null
+}
+step "configure" configure
 step "module" cmake --build "$build" --target Noctiva -j"$jobs"
 step "host" cmake --build "$build" --target noctiva -j"$jobs"
 echo "windows-build: $build/host/Noctiva.8bf $build/host/noctiva.exe"
