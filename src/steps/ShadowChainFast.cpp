@@ -218,15 +218,8 @@ struct cColumns {
 
 // Both column passes over the columns [x0, x0 + n / 3) of `rows`; the result replaces those columns
 // of the core rows, which no other chunk reads. NW is n when fixed at compile time, else 0.
-// Clang (14) cannot clone a function template per target; there it is built once, without AVX2.
-#if defined(__clang__)
-#define NOCTIVA_TEMPLATE_CLONES
-#else
-#define NOCTIVA_TEMPLATE_CLONES NOCTIVA_AVX2_CLONES
-#endif
 template <size_t NW>
-NOCTIVA_TEMPLATE_CLONES void columnChunk(const cColumns& t, int32_t x0, size_t nRun,
-                                                                   int32_t* scratch) {
+NOCTIVA_AVX2_CLONES void columnChunk(const cColumns& t, int32_t x0, size_t nRun, int32_t* scratch) {
     const size_t n = NW != 0 ? NW : nRun;
     constexpr size_t K3 = 3 * size_t(kColumnChunk);
     int32_t* __restrict col = scratch;                                   // first pass, rows v1i0 .. v1i1
