@@ -1,0 +1,40 @@
+#!/usr/bin/env bash
+# The CI stages after the plain test run: the whole suite again in an AddressSanitizer +
+# UndefinedBehaviorSanitizer build (LeakSanitizer included, so every test that loads the module
+# through our host is leak-checked), then each fuzz target for a bounded time.
+#   NOCTIVA_FUZZ_SECONDS  seconds per fuzz target (default 60; 0 skips the fuzz stage)
+set -euo pipefail
+root=$(cd "$(dirname "$0")/.." && pwd)
+fuzzSeconds=${NOCTIVA_FUZZ_SECONDS:-60}
+
+timings=()
+stage() {
+  local name=$1; shift
+  local t0=$SECONDS rc=0
+  echo "=== stage: $name"
+  "$@" || rc=$?
+  timings+=("$(printf '%-22s %5d s%s' "$name" $((SECONDS - t0)) "$([ $rc -eq 0 ] || echo '  FAILED')")")
+  if [ $rc -ne 0 ]; then report; exit $rc; fi
+}
+report() { printf 'stage time: %s\n' "${timings[@]}"; }
+
+sanitizerTests() {
+  cd "$root/build-asan"
+  # Leaks made by GTK's own library constructors are kept out narrowly (tests/robustness/lsan.supp,
+  # libpixman preloaded so its start-up data stays mapped after the module is unloaded; the preload
+  # is why the link-order check is off). Everything else is leak-checked; any finding fails the test.
+  LD_PRELOAD=libpixman-1.so.0 \
+  ASAN_OPTIONS=abort_on_error=1:detect_leaks=1:verify_asan_link_order=0:strict_string_checks=1:detect_stack_use_after_return=1 \
+  LSAN_OPTIONS=suppressions=$root/tests/robustness/lsan.supp:print_suppressions=0 \
+  UBSAN_OPTIONS=print_stacktrace=1:halt_on_error=1 \
+    ctest --output-on-failure -j "$(nproc)"
+}
+
+stage sanitizer-build bash "$root/scripts/build.sh" "$root/build-asan" -DNOCTIVA_SANITIZE=ON \
+  -DNOCTIVA_BUILD_BENCH=OFF -DCMAKE_BUILD_TYPE=RelWithDebInfo
+stage sanitizer-tests sanitizerTests
+if [ "$fuzzSeconds" -gt 0 ]; then
+  stage fuzz-build "$root/scripts/fuzz.sh" 0
+  stage fuzz-runs "$root/scripts/fuzz.sh" "$fuzzSeconds"
+fi
+report
