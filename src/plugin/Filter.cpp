@@ -219,13 +219,10 @@ void cFilter::ReportProgress() {
 namespace {
 void bindBlock(KERNEL::cPixelBlock* block, void* data, int32_t rowBytes, int32_t planeBytes, int16_t hiPlane) {
     if (block == nullptr) return;
-    const int32_t mode = gFilterRecord->imageMode;
-    const bool known = mode >= 0 && mode < KERNEL::kModeCount;
-    block->bytesPerSample =
-        planeBytes != 0 ? uint32_t(planeBytes) : (known ? uint32_t(KERNEL::modeBytesPerSample[mode]) : 0);
-    block->bytesPerPixel = uint32_t(hiPlane + 1) * block->bytesPerSample;
-    if (block->bytesPerPixel == 0 && known) block->bytesPerPixel = uint32_t(KERNEL::modeBytesPerPixel[mode]);
-    block->mode = uint16_t(mode);
+    const cHostLayout layout = hostLayout(planeBytes, hiPlane);
+    block->bytesPerSample = layout.bytesPerSample;
+    block->bytesPerPixel = layout.bytesPerPixel;
+    block->mode = uint16_t(gFilterRecord->imageMode);
     block->data = static_cast<uint8_t*>(data);
     block->rowBytes = uint32_t(rowBytes);
     block->sampling = 1;
@@ -363,26 +360,19 @@ cFilterAction* cHiddenFilter::GetAction() {
     return action;
 }
 
-cStepComponent* cNoctiva::CreateStep1() {
-    auto* step = new cStep1(nullptr, host, nullptr, 0);
-    step->mode = 0;
+namespace {
+// A step with reference count 0: the graph takes the first reference.
+template <typename Step>
+cStepComponent* makeStep(KERNEL::cHost* host, int32_t mode) {
+    auto* step = new Step(nullptr, host, nullptr, nullptr);
+    step->mode = mode;
     return step;
 }
+}  // namespace
 
-cStepComponent* cNoctiva::CreateStep2() {
-    auto* step = new cStep2(nullptr, host, nullptr, 0);
-    step->mode = 104;
-    return step;
-}
-
-cStepComponent* cNoctiva::CreateStep3() {
-    auto* step = new cStep3(nullptr, host, nullptr, 0);
-    step->mode = 0;
-    return step;
-}
-
-cStepComponent* cNoctiva::CreateStep4() {
-    auto* step = new cStep4(nullptr, host, nullptr, 0);
-    step->mode = 0;
-    return step;
-}
+// Only step 2 works by default (mode 104); the others pass their input on until a settings text
+// sets their mode.
+cStepComponent* cNoctiva::CreateStep1() { return makeStep<cStep1>(host, 0); }
+cStepComponent* cNoctiva::CreateStep2() { return makeStep<cStep2>(host, 104); }
+cStepComponent* cNoctiva::CreateStep3() { return makeStep<cStep3>(host, 0); }
+cStepComponent* cNoctiva::CreateStep4() { return makeStep<cStep4>(host, 0); }

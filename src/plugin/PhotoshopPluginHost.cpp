@@ -15,17 +15,18 @@ bool bufferSuiteUsable() {
            procs->unlockProc && procs->freeProc;
 }
 
-// Bytes per sample and per pixel of a host buffer, with the kernel's defaults when the host leaves
-// the plane step unset.
-void hostLayout(int32_t planeBytes, int16_t hiPlane, uint32_t& bytesPerSample, uint32_t& bytesPerPixel) {
+}  // namespace
+
+cHostLayout hostLayout(int32_t planeBytes, int16_t hiPlane) {
     const int32_t mode = gFilterRecord->imageMode;
     const bool known = mode >= 0 && mode < KERNEL::kModeCount;
-    bytesPerSample = planeBytes != 0 ? uint32_t(planeBytes) : (known ? uint32_t(KERNEL::modeBytesPerSample[mode]) : 1);
-    bytesPerPixel = uint32_t(hiPlane + 1) * bytesPerSample;
-    if (bytesPerPixel == 0 && known) bytesPerPixel = uint32_t(KERNEL::modeBytesPerPixel[mode]);
+    cHostLayout layout{};
+    layout.bytesPerSample =
+        planeBytes != 0 ? uint32_t(planeBytes) : (known ? uint32_t(KERNEL::modeBytesPerSample[mode]) : 0);
+    layout.bytesPerPixel = uint32_t(hiPlane + 1) * layout.bytesPerSample;
+    if (layout.bytesPerPixel == 0 && known) layout.bytesPerPixel = uint32_t(KERNEL::modeBytesPerPixel[mode]);
+    return layout;
 }
-
-}  // namespace
 
 cPhotoshopPluginHost::~cPhotoshopPluginHost() = default;
 
@@ -76,29 +77,28 @@ void cPhotoshopPluginHost::GetResolution(float& h, float& v) {
 
 bool cPhotoshopPluginHost::HasMask() { return gFilterRecord->haveMask != 0; }
 
+KERNEL::cPixelBlock* cPhotoshopPluginHost::wrapRequested(void* data, int32_t rowBytes, cHostLayout layout,
+                                                         uint16_t mode) const {
+    // The block's rectangles start at (0, 0), not at the requested area's position.
+    return KERNEL::cPixelBlock::create(static_cast<uint8_t*>(data), (requestRect.right - requestRect.left) * sampleRate,
+                                       (requestRect.bottom - requestRect.top) * sampleRate, layout.bytesPerSample,
+                                       layout.bytesPerPixel, 0, sampleRate, mode, uint32_t(rowBytes), 0, 0);
+}
+
 void cPhotoshopPluginHost::CreateInputBlock(KERNEL::cPixelBlock*& out) {
-    uint32_t bps = 0, bpp = 0;
-    hostLayout(gFilterRecord->inPlaneBytes, gFilterRecord->inHiPlane, bps, bpp);
-    out = KERNEL::cPixelBlock::create(static_cast<uint8_t*>(gFilterRecord->inData),
-                                      (requestRect.right - requestRect.left) * sampleRate,
-                                      (requestRect.bottom - requestRect.top) * sampleRate, bps, bpp, 0, sampleRate,
-                                      uint16_t(gFilterRecord->imageMode), uint32_t(gFilterRecord->inRowBytes), 0, 0);
+    out = wrapRequested(gFilterRecord->inData, gFilterRecord->inRowBytes,
+                        hostLayout(gFilterRecord->inPlaneBytes, gFilterRecord->inHiPlane),
+                        uint16_t(gFilterRecord->imageMode));
 }
 
 void cPhotoshopPluginHost::CreateOutputBlock(KERNEL::cPixelBlock*& out) {
-    uint32_t bps = 0, bpp = 0;
-    hostLayout(gFilterRecord->outPlaneBytes, gFilterRecord->outHiPlane, bps, bpp);
-    out = KERNEL::cPixelBlock::create(static_cast<uint8_t*>(gFilterRecord->outData),
-                                      (requestRect.right - requestRect.left) * sampleRate,
-                                      (requestRect.bottom - requestRect.top) * sampleRate, bps, bpp, 0, sampleRate,
-                                      uint16_t(gFilterRecord->imageMode), uint32_t(gFilterRecord->outRowBytes), 0, 0);
+    out = wrapRequested(gFilterRecord->outData, gFilterRecord->outRowBytes,
+                        hostLayout(gFilterRecord->outPlaneBytes, gFilterRecord->outHiPlane),
+                        uint16_t(gFilterRecord->imageMode));
 }
 
 void cPhotoshopPluginHost::CreateMaskBlock(KERNEL::cPixelBlock*& out) {
-    out = KERNEL::cPixelBlock::create(static_cast<uint8_t*>(gFilterRecord->maskData),
-                                      (requestRect.right - requestRect.left) * sampleRate,
-                                      (requestRect.bottom - requestRect.top) * sampleRate, 1, 1, 0, sampleRate, 0,
-                                      uint32_t(gFilterRecord->maskRowBytes), 0, 0);
+    out = wrapRequested(gFilterRecord->maskData, gFilterRecord->maskRowBytes, cHostLayout{1, 1}, 0);
 }
 
 int16_t cPhotoshopPluginHost::RequestArea(const KERNEL::cRect& area, int32_t rate) {

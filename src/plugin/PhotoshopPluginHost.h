@@ -14,6 +14,14 @@ class cColorTableFactory;
 
 class cPhotoshopPluginHost;
 
+// Bytes per sample and per pixel of a host buffer of the current record, with the kernel's defaults
+// for the image mode where the host leaves the plane step unset.
+struct cHostLayout {
+    uint32_t bytesPerSample;
+    uint32_t bytesPerPixel;
+};
+cHostLayout hostLayout(int32_t planeBytes, int16_t hiPlane);
+
 // Converts single colours through the host's colour services, with a colour table in front.
 class cPhotoshopColorConversion : public KERNEL::cColorConversion {
 public:
@@ -54,6 +62,9 @@ public:
     int16_t RequestArea(const KERNEL::cRect& area, int32_t rate) override;
 
 private:
+    // A block over a host buffer of the last requested area.
+    KERNEL::cPixelBlock* wrapRequested(void* data, int32_t rowBytes, cHostLayout layout, uint16_t mode) const;
+
     KERNEL::cColorTableFactory* colorTableFactory = nullptr;  // not owned
     std::unique_ptr<cPhotoshopColorConversion> colorConversion;
     int32_t sampleRate = 0;
