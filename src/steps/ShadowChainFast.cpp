@@ -15,7 +15,7 @@ using KERNEL::cPixelBlock;
 
 // Row kernels get an AVX2 clone chosen at load time. Clang cannot clone templates; there they
 // stay baseline.
-#if defined(__GNUC__) && !defined(__clang__)
+#if defined(__GNUC__) && !defined(__clang__) && !defined(_WIN32)
 #define NOCTIVA_AVX2_CLONES __attribute__((target_clones("avx2", "default")))
 #else
 #define NOCTIVA_AVX2_CLONES
