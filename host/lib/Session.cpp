@@ -1,5 +1,7 @@
 #include "noctiva/host/Session.h"
 
+#include <algorithm>
+#include <cstring>
 #include <stdexcept>
 #include <utility>
 
@@ -85,7 +87,7 @@ std::string RunResult::message() const {
 Session::Impl* Session::Impl::current() { return tCurrent; }
 
 Session::Impl::Impl(Image& image, RunOptions options)
-    : dest_(image), source_(image), options_(std::move(options)) {
+    : dest_(image), options_(std::move(options)) {
     if ((image.channels != 3 && image.channels != 4) || (image.depth != 8 && image.depth != 16))
         throw std::invalid_argument("the host serves RGB or RGBA images of 8 or 16 bits");
     if (image.width <= 0 || image.height <= 0 || image.width > kMaxImageExtent || image.height > kMaxImageExtent)
@@ -98,6 +100,24 @@ Session::Impl::Impl(Image& image, RunOptions options)
             throw std::invalid_argument("selection outside the image");
         filterArea_ = a;
     }
+    // The source snapshot (and, for 8-bit, the output) at the image's depth: tiles are served
+    // by pointing into them, with no conversion per tile.
+    const int bytesPerSample = image.depth / 8;
+    const std::size_t count = image.samples.size();
+    if (count != std::size_t(image.width) * std::size_t(image.height) * std::size_t(image.channels))
+        throw std::invalid_argument("image samples do not match its size");
+    sourceStore_.resize(count * std::size_t(bytesPerSample));
+    if (bytesPerSample == 2) {
+        std::memcpy(sourceStore_.data(), image.samples.data(), count * 2);
+    } else {
+        std::transform(image.samples.begin(), image.samples.end(), sourceStore_.begin(),
+                       [](std::uint16_t v) { return std::uint8_t(v); });
+        targetStore_ = sourceStore_;
+    }
+    const std::size_t rowBytes = std::size_t(image.width) * std::size_t(image.channels * bytesPerSample);
+    source_ = {sourceStore_.data(), image.width, image.height, image.channels, bytesPerSample, rowBytes};
+    target_ = source_;
+    target_.data = bytesPerSample == 2 ? reinterpret_cast<std::uint8_t*>(image.samples.data()) : targetStore_.data();
     handles.failAllocationAt = options_.failHandleAllocation;
     buffers.cap = options_.bufferCap;
     buffers.failAllocationAt = options_.failBufferAllocation;
@@ -214,9 +234,17 @@ pi::OSErr Session::Impl::serveRequest() {
     r.inData = nullptr;
     r.inRowBytes = 0;
     if (!in.empty()) {
-        const std::string error = fillArea(source_, in, r.inLoPlane, r.inHiPlane, r.inputPadding, inBuffer_, r.inRowBytes);
-        if (!error.empty()) return hostFault("input: " + error);
-        r.inData = inBuffer_.data();
+        if (std::string error = checkRequest(source_, in, r.inLoPlane, r.inHiPlane, r.inputPadding); !error.empty())
+            return hostFault("input: " + error);
+        if (!options_.copyTiles && servedInPlace(source_, in, r.inLoPlane, r.inHiPlane)) {
+            r.inData = source_.at(in.left, in.top);
+            r.inRowBytes = std::int32_t(source_.rowBytes);
+        } else {
+            const std::string error =
+                fillArea(source_, in, r.inLoPlane, r.inHiPlane, r.inputPadding, inBuffer_, r.inRowBytes);
+            if (!error.empty()) return hostFault("input: " + error);
+            r.inData = inBuffer_.data();
+        }
         r.inPlaneBytes = bytesPerSample;
         r.inColumnBytes = (r.inHiPlane - r.inLoPlane + 1) * bytesPerSample;
     }
@@ -226,13 +254,23 @@ pi::OSErr Session::Impl::serveRequest() {
     r.outRowBytes = 0;
     pending_.active = false;
     if (!out.empty()) {
-        const std::string error =
-            fillArea(dest_, out, r.outLoPlane, r.outHiPlane, r.outputPadding, outBuffer_, r.outRowBytes);
-        if (!error.empty()) return hostFault("output: " + error);
-        r.outData = outBuffer_.data();
+        if (std::string error = checkRequest(target_, out, r.outLoPlane, r.outHiPlane, r.outputPadding);
+            !error.empty())
+            return hostFault("output: " + error);
+        // In place only inside the selection: pixels outside it must never change.
+        if (!options_.copyTiles && servedInPlace(target_, out, r.outLoPlane, r.outHiPlane) &&
+            out.within(filterArea_)) {
+            r.outData = target_.at(out.left, out.top);
+            r.outRowBytes = std::int32_t(target_.rowBytes);
+        } else {
+            const std::string error =
+                fillArea(target_, out, r.outLoPlane, r.outHiPlane, r.outputPadding, outBuffer_, r.outRowBytes);
+            if (!error.empty()) return hostFault("output: " + error);
+            r.outData = outBuffer_.data();
+            pending_ = {out, r.outLoPlane, r.outHiPlane, r.outRowBytes, true};
+        }
         r.outPlaneBytes = bytesPerSample;
         r.outColumnBytes = (r.outHiPlane - r.outLoPlane + 1) * bytesPerSample;
-        pending_ = {out, r.outLoPlane, r.outHiPlane, r.outRowBytes, true};
     }
 
     // No mask: the selection is a plain rectangle.
@@ -246,7 +284,7 @@ pi::OSErr Session::Impl::serveRequest() {
 void Session::Impl::commitPending() {
     if (!pending_.active) return;
     // Only the filter rectangle changes: pixels outside the selection are never written.
-    storeArea(dest_, pending_.area, filterArea_, pending_.lo, pending_.hi, outBuffer_.data(), pending_.rowBytes);
+    storeArea(target_, pending_.area, filterArea_, pending_.lo, pending_.hi, outBuffer_.data(), pending_.rowBytes);
     pending_.active = false;
 }
 
@@ -329,10 +367,21 @@ RunResult Session::Impl::run(PluginEntryProc entry) {
         hostFault("host out of memory", pi::memFullErr);
     }
     releaseEverything();
-    // Tiles already stored by a run that then failed must not pass for a result. The session runs
-    // once, so its source snapshot can go back without a copy (nor an allocation that could fail).
-    if (!result_.ok()) std::swap(dest_.samples, source_.samples);
+    settleImage();
     return std::move(result_);
+}
+
+void Session::Impl::settleImage() {
+    // Tiles already stored by a run that then failed must not pass for a result.
+    if (source_.bytesPerSample == 2) {
+        if (!result_.ok()) std::memcpy(dest_.samples.data(), sourceStore_.data(), sourceStore_.size());
+        return;
+    }
+    if (!result_.ok()) return;
+    // Only the selection can have changed.
+    const std::size_t n = std::size_t(filterArea_.width()) * std::size_t(dest_.channels);
+    for (int y = filterArea_.top; y < filterArea_.bottom; ++y)
+        std::copy_n(target_.at(filterArea_.left, y), n, &dest_.samples[dest_.index(filterArea_.left, y)]);
 }
 
 Session::Session(Image& image, RunOptions options) : impl_(std::make_unique<Impl>(image, std::move(options))) {}

@@ -64,9 +64,14 @@ private:
     pi::OSErr hostFault(const std::string& message, pi::OSErr code = pi::paramErr);
     void collectPar1();
     void releaseEverything();
+    void settleImage();
 
     Image& dest_;
-    Image source_;  // the unchanged image: every inData is read from here
+    // The run's pixels at the image's depth. `source_` is the unchanged image every inData is read
+    // from; `target_` receives the output: the caller's own samples for 16-bit, a byte copy for
+    // 8-bit that goes back into the caller's image when the run succeeds.
+    std::vector<std::uint8_t> sourceStore_, targetStore_;
+    Raster source_, target_;
     RunOptions options_;
     RunResult result_;
     Area filterArea_;

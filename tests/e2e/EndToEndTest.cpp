@@ -52,6 +52,12 @@ TEST_P(EndToEnd, RunSucceedsKeepsTheFileShapeAndTouchesOnlyTheSelection) {
     ASSERT_FALSE(result.progress.empty());
     EXPECT_EQ(result.progress.back().first, result.progress.back().second) << "progress ends complete";
 
+    // Tiles served by pointing into the image or through copied buffers: the same pixels.
+    Image copied = source.image;
+    options.copyTiles = true;
+    ASSERT_TRUE(runFilter(noctivaModule().entry(), copied, options).ok());
+    ASSERT_EQ(copied, image);
+
     saveImage(out, image, source.format, &source);
     const LoadedImage written = loadImage(out);
     ASSERT_EQ(written.format, source.format);

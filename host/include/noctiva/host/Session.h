@@ -43,6 +43,9 @@ struct RunOptions {
     int failHandleAllocation = 0;              // 1-based: this newProc returns null (0 = never)
     bool failOnLeak = false;                   // a handle or buffer left behind fails the run
     long maxContinueCalls = 1'000'000;         // a module that never empties its rectangles
+    // Serve every request from copied buffers with padded rows, never by pointing into the image
+    // (which a request for whole pixels inside the image and the selection otherwise gets).
+    bool copyTiles = false;
 
     std::function<void(std::int32_t done, std::int32_t total)> onProgress;
 };
