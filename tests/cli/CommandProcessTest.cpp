@@ -58,7 +58,7 @@ TEST_P(CommandRoundTrip, KeepsSizeDepthAndAlphaAndChangesTheColours) {
     const fs::path in = folder / c.input, out = folder / c.output;
     FileFormat inFormat{}, outFormat{};
     ASSERT_TRUE(formatFromExtension(in, inFormat));
-    ASSERT_TRUE(formatFromExtension(out, outFormat));
+    if (!formatFromExtension(out, outFormat)) outFormat = inFormat;  // no extension: the input's format
     saveImage(in, hosttest::patternImage(41, 23, c.channels, c.depth, 7), inFormat);
 
     const clitest::Outcome o = run(q(in) + " -o " + q(out) + moduleArgument());
@@ -85,7 +85,8 @@ INSTANTIATE_TEST_SUITE_P(Formats, CommandRoundTrip,
                          ::testing::Values(RoundTrip{"rgb8.png", "out.png", 3, 8}, RoundTrip{"rgba16.png", "out.png", 4, 16},
                                            RoundTrip{"rgba8.tif", "out.tif", 4, 8},
                                            RoundTrip{"rgb16.tiff", "out.tiff", 3, 16},
-                                           RoundTrip{"rgba16.png", "converted.tif", 4, 16}),
+                                           RoundTrip{"rgba16.png", "converted.tif", 4, 16},
+                                           RoundTrip{"rgba16.tif", "noextension", 4, 16}),
                          [](const auto& info) {
                              std::string name = std::string(info.param.input) + "_" + info.param.output;
                              std::replace(name.begin(), name.end(), '.', '_');
@@ -251,7 +252,9 @@ TEST(Command, EveryErrorIsOneLineWithTheFileAndLeavesNoOutput) {
     struct Case {
         std::string arguments;
         std::string expected;  // part of the single stderr line
+        std::string module = moduleArgument();
     };
+    const std::string fake = " --module " + q(FAKE_MODULE_PATH);
     const Case cases[] = {
         {q(folder / "missing.png") + out, (folder / "missing.png").string() + ": cannot open"},
         {q(folder / "adir") + out, "adir: is a directory"},
@@ -263,6 +266,11 @@ TEST(Command, EveryErrorIsOneLineWithTheFileAndLeavesNoOutput) {
         {in + out + " --selection 4,4,3,3", "in.png: selection 4,4,3,3 lies outside the 6 x 6 image"},
         {in + out + " --selection -1,0,2,2", "selection -1,0,2,2 lies outside"},
         {in + out + " --selection 0,0,0,2", "has no area"},
+        {in + out + " --selection 1,2", "is not X,Y,W,H"},
+        // Module failures, told by the fake module, carry the code and its meaning.
+        {in + out + " --par1 fail=-108", "-108 (out of memory)", fake},
+        {in + out + " --par1 fail=-30101", "-30101 (image mode not supported by the filter)", fake},
+        {in + out + " --module /nonexistent.so", "/nonexistent.so: cannot load module", ""},
         {in + out + " --compare " + q(folder / "c.png") + " --compare-crop 5,5,2,2", "compare crop 5,5,2,2 lies outside"},
         {in + out + " --compare " + q(folder / "c.jpg"), "c.jpg: the compare picture is a PNG file"},
         {in + " -o " + q(folder / "nodir" / "out.png"), "nodir/out.png: cannot create file"},
@@ -276,7 +284,7 @@ TEST(Command, EveryErrorIsOneLineWithTheFileAndLeavesNoOutput) {
         {in + out + " --save-par1 " + q(folder / "nodir" / "p.txt"), "p.txt: cannot write file"},
     };
     for (const Case& c : cases) {
-        const clitest::Outcome o = run(c.arguments + moduleArgument());
+        const clitest::Outcome o = run(c.arguments + c.module);
         EXPECT_EQ(o.status, 1) << c.arguments;
         EXPECT_EQ(o.err.rfind("noctiva: ", 0), 0u) << o.err;
         EXPECT_NE(o.err.find(c.expected), std::string::npos) << c.arguments << "\n" << o.err;

@@ -74,13 +74,6 @@ TEST(FakeModule, Par1AndDResReachTheModuleAndPar1ComesBack) {
     EXPECT_EQ(result.par1Out, "tiles=1 moves=0 dres=3 colors=0 got=op=copy hello");
 }
 
-TEST(FakeModule, WithoutParametersTheModuleSeesNoDescriptor) {
-    Image image = hosttest::patternImage(4, 4, 3, 8);
-    const RunResult result = runFilter(fakeModule().entry(), image, RunOptions{});
-    ASSERT_TRUE(result.ok()) << result.message();
-    EXPECT_EQ(result.par1Out, "tiles=1 moves=0 dres=-1 colors=0 got=");
-}
-
 TEST(FakeModule, RelocationMovesTheFilterObjectBetweenCalls) {
     for (const bool relocate : {false, true}) {
         Image image = hosttest::patternImage(10, 10, 3, 8);
@@ -94,59 +87,12 @@ TEST(FakeModule, RelocationMovesTheFilterObjectBetweenCalls) {
     }
 }
 
-TEST(FakeModule, LeaksAreDetected) {
-    struct Case {
-        const char* orders;
-        int handles, buffers;
-    };
-    for (const Case c : {Case{"leak=handle", 1, 0}, Case{"buffer=100 leak=buffer", 0, 1}}) {
-        Image image = hosttest::patternImage(4, 4, 3, 8);
-        const RunResult result = runFake(image, c.orders);
-        EXPECT_EQ(result.leaks.handles, c.handles) << c.orders;
-        EXPECT_EQ(result.leaks.buffers, c.buffers) << c.orders;
-        EXPECT_FALSE(result.ok());
-        EXPECT_NE(result.message().find("leaked"), std::string::npos) << result.message();
-    }
-}
-
-TEST(FakeModule, MemoryFailuresEndTheRunWithOutOfMemoryAndNoLeak) {
-    struct Case {
-        const char* what;
-        RunOptions options;
-        const char* selector;
-    };
-    RunOptions cap, lock, handle;
-    cap.bufferCap = 500;
-    lock.failBufferLock = 1;
-    handle.failHandleAllocation = 1;
-    for (const Case& c : {Case{"buffer cap", cap, "Start"}, Case{"buffer lock", lock, "Continue"},
-                          Case{"object handle", handle, "Prepare"}}) {
-        Image image = hosttest::patternImage(8, 8, 3, 8);
-        const Image original = image;
-        const RunResult result = runFake(image, "buffer=1000 tile=4", c.options);
-        EXPECT_EQ(result.result, pi::memFullErr) << c.what;
-        EXPECT_EQ(result.failedSelector, c.selector) << c.what;
-        EXPECT_FALSE(result.leaks.any()) << c.what << ": " << result.leaks.describe();
-        EXPECT_EQ(image, original) << c.what << ": nothing was processed";
-    }
-}
-
 TEST(FakeModule, ModuleErrorCodesAreReportedWithTheirMeaning) {
     Image image = hosttest::patternImage(4, 4, 3, 8);
     const RunResult result = runFake(image, "fail=-30100");
     EXPECT_EQ(result.result, pi::filterBadParameters);
     EXPECT_EQ(result.failedSelector, "Continue");
     EXPECT_EQ(result.message(), "module failed in Continue with -30100 (bad filter parameters)");
-}
-
-TEST(FakeModule, EndlessModuleIsStopped) {
-    Image image = hosttest::patternImage(4, 4, 3, 8);
-    RunOptions options;
-    options.maxContinueCalls = 40;
-    const RunResult result = runFake(image, "endless=1", options);
-    EXPECT_FALSE(result.ok());
-    EXPECT_EQ(result.continueCalls, 41);  // the 41st is refused
-    EXPECT_NE(result.hostError.find("never finished"), std::string::npos);
 }
 
 TEST(FakeModule, ColourServicesAreCountedAndRoundTrip) {
@@ -156,8 +102,6 @@ TEST(FakeModule, ColourServicesAreCountedAndRoundTrip) {
     EXPECT_EQ(result.colorServiceCalls, 8);
     EXPECT_NE(result.par1Out.find("colors=4 "), std::string::npos) << result.par1Out;
 }
-
-TEST(FakeModule, AboutAnswers) { EXPECT_EQ(Session::about(fakeModule().entry()), 0); }
 
 TEST(Module, LoadFailuresNameTheFile) {
     try {

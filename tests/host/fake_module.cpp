@@ -6,8 +6,6 @@
 //   inpad=P outpad=P    padding codes
 //   advance=1           do all the work inside Start through advanceState
 //   buffer=N            allocate, lock and use a scratch buffer of N bytes for every tile
-//   leak=handle|buffer  leave something behind at Finish
-//   endless=1           never stop requesting pixels
 //   fail=C              return C from the first Continue
 //   color=1             convert every tile's first pixel RGB -> HSB -> RGB through colour services
 // At Finish it records in 'par1': "tiles=T moves=M dres=D colors=C got=<the par1 it received>".
@@ -27,8 +25,6 @@ struct Config {
     int inPad = -1, outPad = -1;
     bool advance = false;
     int buffer = 0;
-    bool leakHandle = false, leakBuffer = false;
-    bool endless = false;
     int fail = 0;
     bool color = false;
 };
@@ -61,9 +57,6 @@ void parse(State& s) {
     c.outPad = value(s.par1, "outpad=", -1);
     c.advance = value(s.par1, "advance=", 0) != 0;
     c.buffer = value(s.par1, "buffer=", 0);
-    c.leakHandle = std::strstr(s.par1, "leak=handle") != nullptr;
-    c.leakBuffer = std::strstr(s.par1, "leak=buffer") != nullptr;
-    c.endless = value(s.par1, "endless=", 0) != 0;
     c.fail = value(s.par1, "fail=", 0);
     c.color = value(s.par1, "color=", 0) != 0;
 }
@@ -120,11 +113,7 @@ int height(const pi::FilterRecord* r) { return r->filterRect.bottom - r->filterR
 // Publishes the current tile, or empty rectangles when tileY has run past the end.
 void publish(pi::FilterRecord* r, const State& s) {
     const Config& c = s.cfg;
-    if (s.tileY >= height(r) || c.endless) {
-        if (c.endless) {
-            r->inRect = r->outRect = {0, 0, 1, 1};
-            return;
-        }
+    if (s.tileY >= height(r)) {
         r->inRect = r->outRect = r->maskRect = {0, 0, 0, 0};
         return;
     }
@@ -240,20 +229,17 @@ void onContinue(pi::FilterRecord* r, State& s, pi::int16* result) {
         *result = pi::int16(s.cfg.fail);
         return;
     }
-    if (!s.cfg.endless) {
-        if (const pi::OSErr err = process(r, s); err != 0) {
-            *result = err;
-            return;
-        }
-        advance(r, s);
+    if (const pi::OSErr err = process(r, s); err != 0) {
+        *result = err;
+        return;
     }
+    advance(r, s);
     publish(r, s);
     *result = 0;
 }
 
 void onFinish(pi::FilterRecord* r, State& s) {
-    if (s.scratch && !s.cfg.leakBuffer) r->bufferProcs->freeProc(s.scratch);
-    if (s.cfg.leakHandle) r->handleProcs->newProc(16);
+    if (s.scratch) r->bufferProcs->freeProc(s.scratch);
     writeDescriptor(r, s);
 }
 
