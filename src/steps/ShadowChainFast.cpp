@@ -5,6 +5,7 @@
 #include <cstring>
 #include <optional>
 #include <stdexcept>
+#include <type_traits>
 
 #include "kernel/Lab.h"
 #include "kernel/PixelBlock.h"
@@ -65,15 +66,14 @@ int64_t multiplicity(int32_t y, int32_t a, int32_t b, int32_t size) {
 constexpr float kBoxScale = 1.0f / float(kN);
 inline int32_t boxMean(int32_t sum) { return int32_t(float(sum) * kBoxScale); }
 
-// Box means along an interleaved 3-channel line: ext holds positions i0 - kR .. i0 + count - 1 + kR
-// (already clamped), out receives `count` pixels. Each sum is taken afresh from its 13 taps: the
-// taps are exact integers, so this equals a running sum, and it has no serial dependency.
+// Box means along one channel's line: ext holds positions i0 - kR .. i0 + count - 1 + kR (already
+// clamped), out receives `count` means. Each sum is taken afresh from its 13 taps: the taps are
+// exact integers, so this equals a running sum, and it has no serial dependency.
 template <class T>
 inline void boxLineT(const int32_t* __restrict ext, int32_t count, T* __restrict out) {
-    const int32_t n = 3 * count;
-    for (int32_t j = 0; j < n; ++j) {
+    for (int32_t j = 0; j < count; ++j) {
         int32_t s = 0;
-        for (int32_t k = 0; k < kN; ++k) s += ext[j + 3 * k];
+        for (int32_t k = 0; k < kN; ++k) s += ext[j + k];
         out[j] = T(boxMean(s));
     }
 }
@@ -81,8 +81,8 @@ NOCTIVA_AVX2_CLONES void boxLine(const int32_t* ext, int32_t count, int32_t* out
     boxLineT(ext, count, out);
 }
 // Input L of a Lab line's pixels [0, n).
-NOCTIVA_AVX2_CLONES void takeL(const int32_t* lab, int32_t n, uint16_t* out) {
-    for (int32_t i = 0; i < n; ++i) out[i] = uint16_t(lab[3 * i]);
+NOCTIVA_AVX2_CLONES void takeL(const int32_t* L, int32_t n, uint16_t* out) {
+    for (int32_t i = 0; i < n; ++i) out[i] = uint16_t(L[i]);
 }
 // Means of host samples' Lab or RGB values lie in 0..65535 (a and b of host samples cannot reach
 // -1), so the tile's row-pass and column-pass results are kept in 16 bits: half the cache.
@@ -131,20 +131,26 @@ inline void toRGB32(int32_t L, int32_t A, int32_t B, int32_t& r, int32_t& g, int
     b = clamp16(L + 54612 - q - B);
 }
 
+// Lines are planar: a channel's values for every position, then the next channel's, `plane`
+// apart. Planar lines make every pass but the host conversions a run over contiguous values.
+//
 // Host pixels [0, n) of one row to the working scale, as Lab or as RGB. CH is the pixel's sample
 // count when known at compile time (3, 4), else 0 and `ch` gives it.
 template <class S, int CH, bool LAB>
-inline void convertSpan(const S* __restrict in, int32_t ch, int32_t n, int32_t* __restrict out) {
+inline void convertSpan(const S* __restrict in, int32_t ch, int32_t n, int32_t* __restrict out, size_t plane) {
     const int32_t step = CH != 0 ? CH : ch;
+    int32_t* __restrict o0 = out;
+    int32_t* __restrict o1 = out + plane;
+    int32_t* __restrict o2 = out + 2 * plane;
     for (int32_t i = 0; i < n; ++i) {
         const S* p = in + size_t(i) * size_t(step);
         const int32_t R = toWork<S>(p[0]), G = toWork<S>(p[1]), B = toWork<S>(p[2]);
         if constexpr (LAB) {
-            toLab32(R, G, B, out[3 * i], out[3 * i + 1], out[3 * i + 2]);
+            toLab32(R, G, B, o0[i], o1[i], o2[i]);
         } else {
-            out[3 * i] = R;
-            out[3 * i + 1] = G;
-            out[3 * i + 2] = B;
+            o0[i] = R;
+            o1[i] = G;
+            o2[i] = B;
         }
     }
 }
@@ -153,15 +159,17 @@ inline void convertSpan(const S* __restrict in, int32_t ch, int32_t n, int32_t* 
 // Lab back and the host's depth. `input` holds the input L the row phase computed. The alpha
 // sample, if any, is left as it is.
 template <class S, int CH>
-inline void mixSpan(const uint16_t* __restrict input, const uint16_t* __restrict blur, int32_t ch, int32_t n,
-                    S* __restrict out) {
+inline void mixSpan(const uint16_t* __restrict input, const uint16_t* __restrict blur, size_t plane, int32_t ch,
+                    int32_t n, S* __restrict out) {
     const int32_t step = CH != 0 ? CH : ch;
+    const uint16_t* __restrict bL = blur;
+    const uint16_t* __restrict bA = blur + plane;
+    const uint16_t* __restrict bB = blur + 2 * plane;
     for (int32_t i = 0; i < n; ++i) {
-        const uint16_t* t = blur + 3 * i;
         // Both terms are >= 0: the unsigned division is the signed one and vectorises.
-        const int32_t L = int32_t(uint32_t(t[0] + 2 * int32_t(input[i])) / 3u);
+        const int32_t L = int32_t(uint32_t(bL[i] + 2 * int32_t(input[i])) / 3u);
         int32_t R, G, B;
-        toRGB32(L, t[1], t[2], R, G, B);
+        toRGB32(L, bA[i], bB[i], R, G, B);
         S* o = out + size_t(i) * size_t(step);
         o[0] = fromWork<S>(R);
         o[1] = fromWork<S>(G);
@@ -171,7 +179,7 @@ inline void mixSpan(const uint16_t* __restrict input, const uint16_t* __restrict
 
 // One pixel whose frame position is taken `times` times (clamped edges): the mix repeats.
 template <class S>
-inline void mixPixel(const S* p, const uint16_t* t, int64_t times, S* o) {
+inline void mixPixel(const S* p, const uint16_t* t, size_t plane, int64_t times, S* o) {
     const int32_t R0 = toWork<S>(p[0]), G0 = toWork<S>(p[1]), B0 = toWork<S>(p[2]);
     const int32_t Ls = ((2 * R0 + 3 * G0 + B0) * 170) >> 10;
     int32_t L = (t[0] + 2 * Ls) / 3;
@@ -181,7 +189,7 @@ inline void mixPixel(const S* p, const uint16_t* t, int64_t times, S* o) {
         L = next;
     }
     int32_t R, G, B;
-    toRGB32(L, t[1], t[2], R, G, B);
+    toRGB32(L, t[plane], t[2 * plane], R, G, B);
     o[0] = fromWork<S>(R);
     o[1] = fromWork<S>(G);
     o[2] = fromWork<S>(B);
@@ -190,17 +198,15 @@ inline void mixPixel(const S* p, const uint16_t* t, int64_t times, S* o) {
 // Row kernels for one sample type and pixel layout, compiled for AVX2 and for the baseline.
 template <class S, int CH>
 struct cKernels {
-    NOCTIVA_AVX2_CLONES static void convertRgb(const S* in, int32_t ch, int32_t n,
-                                                                           int32_t* out) {
-        convertSpan<S, CH, false>(in, ch, n, out);
+    NOCTIVA_AVX2_CLONES static void convertRgb(const S* in, int32_t ch, int32_t n, int32_t* out, size_t plane) {
+        convertSpan<S, CH, false>(in, ch, n, out, plane);
     }
-    NOCTIVA_AVX2_CLONES static void convertLab(const S* in, int32_t ch, int32_t n,
-                                                                           int32_t* out) {
-        convertSpan<S, CH, true>(in, ch, n, out);
+    NOCTIVA_AVX2_CLONES static void convertLab(const S* in, int32_t ch, int32_t n, int32_t* out, size_t plane) {
+        convertSpan<S, CH, true>(in, ch, n, out, plane);
     }
-    NOCTIVA_AVX2_CLONES static void mix(const uint16_t* in, const uint16_t* blur, int32_t ch,
-                                                                    int32_t n, S* out) {
-        mixSpan<S, CH>(in, blur, ch, n, out);
+    NOCTIVA_AVX2_CLONES static void mix(const uint16_t* in, const uint16_t* blur, size_t plane, int32_t ch,
+                                        int32_t n, S* out) {
+        mixSpan<S, CH>(in, blur, plane, ch, n, out);
     }
 };
 
@@ -208,7 +214,6 @@ struct cKernels {
 struct cColumns {
     uint16_t* rows;
     size_t rowStride;
-    int32_t rowsX0;  // first column held in `rows`
     int32_t H;
     int32_t v1i0, v1i1, v2i0, v2i1;
     const cPass* v1;
@@ -216,8 +221,9 @@ struct cColumns {
     bool v1Special, v2Special;
 };
 
-// Both column passes over the columns [x0, x0 + n / 3) of `rows`; the result replaces those columns
-// of the core rows, which no other chunk reads. NW is n when fixed at compile time, else 0.
+// Both column passes over the values [x0, x0 + n) of every row of `rows` (any channel: each value
+// is its own column); the result replaces those values in the core rows, which no other chunk
+// reads. NW is n when fixed at compile time, else 0.
 template <size_t NW>
 NOCTIVA_AVX2_CLONES void columnChunk(const cColumns& t, int32_t x0, size_t nRun, int32_t* scratch) {
     const size_t n = NW != 0 ? NW : nRun;
@@ -226,7 +232,7 @@ NOCTIVA_AVX2_CLONES void columnChunk(const cColumns& t, int32_t x0, size_t nRun,
     int32_t* __restrict sums = scratch + K3 * size_t(t.v1i1 - t.v1i0);  // running sums
     uint16_t* const rows = t.rows;
     auto rowAt = [&](int64_t y) -> const uint16_t* {
-        return rows + size_t(clampIndex(y, t.H)) * t.rowStride + 3 * size_t(x0 - t.rowsX0);
+        return rows + size_t(clampIndex(y, t.H)) * t.rowStride + size_t(x0);
     };
     auto colAt = [&](int64_t y) -> const int32_t* { return col + K3 * size_t(clampIndex(y, t.H) - t.v1i0); };
     auto sumAround = [&](auto at, int64_t centre) {
@@ -260,7 +266,7 @@ NOCTIVA_AVX2_CLONES void columnChunk(const cColumns& t, int32_t x0, size_t nRun,
     const int32_t special = t.v2Special ? t.v2->hi - 1 : -1;
     sumAround(colAt, t.v2i0);
     for (int32_t y = t.v2i0; y < t.v2i1; ++y) {
-        uint16_t* __restrict o = rows + size_t(y) * t.rowStride + 3 * size_t(x0 - t.rowsX0);
+        uint16_t* __restrict o = rows + size_t(y) * t.rowStride + size_t(x0);
         if (y == special) {
             int32_t last[K3];
             for (size_t c = 0; c < n; ++c) last[c] = 0;
@@ -277,6 +283,11 @@ NOCTIVA_AVX2_CLONES void columnChunk(const cColumns& t, int32_t x0, size_t nRun,
         const int32_t* trail = colAt(int64_t(y) - kR);
         for (size_t c = 0; c < n; ++c) sums[c] += lead[c] - trail[c];
     }
+}
+
+// Scratch shared by the phases of every tile: it only grows, so no tile pays for clearing it.
+inline void grow(std::vector<int32_t>& v, size_t n) {
+    if (v.size() < n) v.resize(n);
 }
 
 struct cGeometry {
@@ -318,8 +329,8 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
     if (h2i0 >= h2i1 || v2i0 >= v2i1 || h1i0 >= h1i1 || v1i0 >= v1i1 || r0 >= r1) return;
 
     const int32_t ch = int32_t(source.bytesPerPixel / sizeof(S));
-    // `rows` holds the core's columns, row by row over the whole tile height.
-    const size_t rowStride = size_t(h2i1 - h2i0) * 3;
+    // `rows` holds the core's columns, row by row over the whole tile height, each row planar.
+    const size_t rowPlane = size_t(h2i1 - h2i0), rowStride = 3 * rowPlane;
     uint16_t* const inputL = rows + rowStride * size_t(g.H);  // core rows by core columns
     const bool h1Special = h1.special(h1i0, h1i1), h2Special = h2.special(h2i0, h2i1);
     const bool v1Special = v1.special(v1i0, v1i1), v2Special = v2.special(v2i0, v2i1);
@@ -335,22 +346,37 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
     const size_t ext1 = size_t(p1 - p0), ext2 = size_t(std::max(q1, h1i1) - q0);
     auto rowsPart = [&](int part, int32_t b, int32_t e) {
         std::vector<int32_t>& buf = lines[size_t(part)];
-        buf.resize(3 * (ext1 + ext2));
+        grow(buf, 3 * (ext1 + ext2));
         int32_t* e1 = buf.data();
         int32_t* e2 = e1 + 3 * ext1;
-        auto replicate = [](int32_t* line, int32_t first, int32_t last, int32_t from) {
-            for (int32_t j = first; j < last; ++j) std::memcpy(line + 3 * j, line + 3 * from, 3 * sizeof(int32_t));
+        auto replicate = [](int32_t* line, size_t plane, int32_t first, int32_t last, int32_t from) {
+            for (int c = 0; c < 3; ++c, line += plane)
+                for (int32_t j = first; j < last; ++j) line[j] = line[from];
+        };
+        // The box pass over every channel, and the position the clamped write gives to the pass's
+        // last position (`special`), at `at` of the output.
+        auto pass = [](const int32_t* in, size_t inPlane, int32_t count, auto* out, size_t outPlane) {
+            for (int c = 0; c < 3; ++c) boxLine(in + size_t(c) * inPlane, count, out + size_t(c) * outPlane);
+        };
+        auto lastPosition = [&](const int32_t* in, size_t inPlane, int32_t inFirst, const cPass& h, auto* out,
+                                size_t outPlane, size_t at) {
+            for (int c = 0; c < 3; ++c) {
+                int32_t sum = 0;
+                for (int32_t k = -kR; k <= kR; ++k)
+                    sum += in[size_t(c) * inPlane + size_t(clampIndex(int64_t(h.b) - 1 + k, g.W) - inFirst)];
+                out[size_t(c) * outPlane + at] = std::remove_reference_t<decltype(*out)>(boxMean(sum));
+            }
         };
         for (int32_t y = r0 + b; y < r0 + e; ++y) {
             const S* in = reinterpret_cast<const S*>(source.data + size_t(y) * source.rowBytes);
             auto convert = [&](int32_t x0, int32_t x1, bool lab) {
                 if (x0 >= x1) return;
                 const S* at = in + size_t(x0) * size_t(ch);
-                int32_t* out = e1 + 3 * size_t(x0 - p0);
+                int32_t* out = e1 + size_t(x0 - p0);
                 if (lab)
-                    K::convertLab(at, ch, x1 - x0, out);
+                    K::convertLab(at, ch, x1 - x0, out, ext1);
                 else
-                    K::convertRgb(at, ch, x1 - x0, out);
+                    K::convertRgb(at, ch, x1 - x0, out, ext1);
             };
             if (y >= g.labY0 && y < g.labY1) {
                 convert(s0, std::min(s1, g.labX0), false);
@@ -359,54 +385,41 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
             } else {
                 convert(s0, s1, false);
             }
-            replicate(e1, 0, s0 - p0, s0 - p0);
-            replicate(e1, s1 - p0, p1 - p0, s1 - 1 - p0);
+            replicate(e1, ext1, 0, s0 - p0, s0 - p0);
+            replicate(e1, ext1, s1 - p0, p1 - p0, s1 - 1 - p0);
             // The core lies inside the Lab stage's area: keep its input L for the mix.
             if (y >= v2i0 && y < v2i1)
-                takeL(e1 + 3 * size_t(h2i0 - p0), h2i1 - h2i0, inputL + size_t(y - v2i0) * size_t(h2i1 - h2i0));
+                takeL(e1 + size_t(h2i0 - p0), h2i1 - h2i0, inputL + size_t(y - v2i0) * rowPlane);
 
-            int32_t* b1 = e2 + 3 * size_t(h1i0 - q0);
-            boxLine(e1, h1i1 - h1i0, b1);
-            if (h1Special) {
-                int32_t sum[3] = {0, 0, 0};
-                for (int32_t k = -kR; k <= kR; ++k) {
-                    const int32_t* v = e1 + 3 * size_t(clampIndex(int64_t(h1.b) - 1 + k, g.W) - p0);
-                    for (int c = 0; c < 3; ++c) sum[c] += v[c];
-                }
-                for (int c = 0; c < 3; ++c) b1[3 * size_t(h1.hi - 1 - h1i0) + c] = boxMean(sum[c]);
-            }
+            int32_t* b1 = e2 + size_t(h1i0 - q0);
+            pass(e1, ext1, h1i1 - h1i0, b1, ext2);
+            if (h1Special) lastPosition(e1, ext1, p0, h1, b1, ext2, size_t(h1.hi - 1 - h1i0));
             // Line 2's clamped positions: stored 0 before, stored W - 1 after.
-            replicate(e2, 0, std::max(0, -q0), -q0);
-            replicate(e2, std::max(0, g.W - q0), q1 - q0, g.W - 1 - q0);
+            replicate(e2, ext2, 0, std::max(0, -q0), -q0);
+            replicate(e2, ext2, std::max(0, g.W - q0), q1 - q0, g.W - 1 - q0);
 
             uint16_t* out = rows + size_t(y) * rowStride;
-            boxLine(e2, h2i1 - h2i0, out);
-            if (h2Special) {
-                int32_t sum[3] = {0, 0, 0};
-                for (int32_t k = -kR; k <= kR; ++k) {
-                    const int32_t* v = e2 + 3 * size_t(clampIndex(int64_t(h2.b) - 1 + k, g.W) - q0);
-                    for (int c = 0; c < 3; ++c) sum[c] += v[c];
-                }
-                for (int c = 0; c < 3; ++c) out[3 * size_t(h2.hi - 1 - h2i0) + c] = uint16_t(boxMean(sum[c]));
-            }
+            pass(e2, ext2, h2i1 - h2i0, out, rowPlane);
+            if (h2Special) lastPosition(e2, ext2, q0, h2, out, rowPlane, size_t(h2.hi - 1 - h2i0));
         }
     };
 
-    // Columns, in chunks: both column passes; the result replaces the chunk's own columns of the
-    // core rows in `rows`, which no other chunk reads.
-    const int32_t columns = h2i1 - h2i0;
-    const int32_t chunks = (columns + kColumnChunk - 1) / kColumnChunk;
-    const cColumns cv{rows, rowStride, h2i0, g.H, v1i0, v1i1, v2i0, v2i1, &v1, &v2, v1Special, v2Special};
+    // Columns, in chunks of a row's values: both column passes; the result replaces the chunk's own
+    // values of the core rows in `rows`, which no other chunk reads.
+    constexpr int32_t kChunkValues = 3 * kColumnChunk;
+    const int32_t values = int32_t(rowStride);
+    const int32_t chunks = (values + kChunkValues - 1) / kChunkValues;
+    const cColumns cv{rows, rowStride, g.H, v1i0, v1i1, v2i0, v2i1, &v1, &v2, v1Special, v2Special};
     auto columnsPart = [&](int part, int32_t b, int32_t e) {
         std::vector<int32_t>& buf = lines[size_t(part)];
-        buf.resize(3 * size_t(kColumnChunk) * size_t(v1i1 - v1i0 + 1));
+        grow(buf, size_t(kChunkValues) * size_t(v1i1 - v1i0 + 1));
         for (int32_t chunk = b; chunk < e; ++chunk) {
-            const int32_t x0 = h2i0 + chunk * kColumnChunk;
-            const int32_t x1 = std::min(x0 + kColumnChunk, h2i1);
-            if (x1 - x0 == kColumnChunk)
-                columnChunk<3 * kColumnChunk>(cv, x0, 0, buf.data());
+            const int32_t x0 = chunk * kChunkValues;
+            const int32_t x1 = std::min(x0 + kChunkValues, values);
+            if (x1 - x0 == kChunkValues)
+                columnChunk<kChunkValues>(cv, x0, 0, buf.data());
             else
-                columnChunk<0>(cv, x0, 3 * size_t(x1 - x0), buf.data());
+                columnChunk<0>(cv, x0, size_t(x1 - x0), buf.data());
         }
     };
 
@@ -425,14 +438,15 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
                 // source and destination may be one buffer).
                 const int32_t a = colMultFirst != 1 ? 1 : 0, z = n > 1 && colMultLast != 1 ? n - 1 : n;
                 const uint16_t* ls = inputL + size_t(y - v2i0) * size_t(n);
-                if (z > a) K::mix(ls + a, blur + 3 * size_t(a), ch, z - a, out + size_t(a) * size_t(ch));
-                if (a == 1) mixPixel<S>(in, blur, colMultFirst, out);
+                if (z > a) K::mix(ls + a, blur + size_t(a), rowPlane, ch, z - a, out + size_t(a) * size_t(ch));
+                if (a == 1) mixPixel<S>(in, blur, rowPlane, colMultFirst, out);
                 if (z == n - 1)
-                    mixPixel<S>(in + size_t(z) * size_t(ch), blur + 3 * size_t(z), colMultLast, out + size_t(z) * size_t(ch));
+                    mixPixel<S>(in + size_t(z) * size_t(ch), blur + size_t(z), rowPlane, colMultLast,
+                                out + size_t(z) * size_t(ch));
             } else {
                 for (int32_t x = h2i0; x < h2i1; ++x) {
                     const size_t i = size_t(x - h2i0);
-                    mixPixel<S>(in + i * size_t(ch), blur + 3 * i, rowMult * multiplicity(x, fx0, fx1, g.W),
+                    mixPixel<S>(in + i * size_t(ch), blur + i, rowPlane, rowMult * multiplicity(x, fx0, fx1, g.W),
                                 out + i * size_t(ch));
                 }
             }
