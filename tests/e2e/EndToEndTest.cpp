@@ -7,18 +7,15 @@
 
 #include "host/TestSupport.h"
 #include "noctiva/host/ImageFile.h"
-#include "noctiva/host/Module.h"
 #include "noctiva/host/Session.h"
+#include "support/NoctivaModule.h"
 
 using namespace noctiva::host;
 namespace fs = std::filesystem;
 
 namespace {
 
-const Module& noctivaModule() {
-    static const Module module(NOCTIVA_MODULE_PATH);
-    return module;
-}
+using testsupport::noctivaModule;
 
 struct Case {
     const char* name;

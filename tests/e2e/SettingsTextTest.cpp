@@ -5,18 +5,12 @@
 #include <string_view>
 
 #include "host/TestSupport.h"
-#include "noctiva/host/Module.h"
 #include "noctiva/host/Session.h"
-#include "steps/ParameterTable.h"
+#include "support/NoctivaModule.h"
 
 using namespace noctiva::host;
 
 namespace {
-
-const Module& noctiva() {
-    static const Module module(NOCTIVA_MODULE_PATH);
-    return module;
-}
 
 // The text of all 58 entries after a signature, the defaults overridden by number.
 std::string entries(int number = -1, const std::string& value = "") {
@@ -32,7 +26,7 @@ RunResult run(std::optional<std::string> par1, Image& image) {
     RunOptions options;
     options.par1 = std::move(par1);
     options.failOnLeak = true;
-    return runFilter(noctiva().entry(), image, options);
+    return runFilter(testsupport::noctivaModule().entry(), image, options);
 }
 
 TEST(SettingsText, WhatIsReadBackDecidesTheRun) {

@@ -12,30 +12,18 @@
 #include "host/TestSupport.h"
 #include "kernel/FilterAction.h"
 #include "kernel/PixelBlock.h"
-#include "noctiva/host/Module.h"
 #include "noctiva/host/Session.h"
-#include "steps/ParameterTable.h"
 #include "steps/ShadowChain.h"
 #include "steps/Step1.h"
 #include "steps/Step2.h"
 #include "steps/Step3.h"
 #include "steps/Step4.h"
 #include "support/MallocHost.h"
+#include "support/NoctivaModule.h"
 
 using namespace noctiva::host;
 
 namespace {
-
-// The settings text with the defaults, overridden by number.
-std::string settings(const std::map<int, int>& overrides) {
-    std::string text = "vek ";
-    for (const auto& p : shadowParameterTable()) {
-        const auto it = overrides.find(int(p.number));
-        text += " Parameter" + std::to_string(p.number) + " " +
-                std::to_string(it != overrides.end() ? it->second : p.defaultValue) + " ";
-    }
-    return text;
-}
 
 // The whole image as one tile through the kernel: the chain sees the image's edges on every side and
 // no tile edge anywhere.
@@ -74,15 +62,14 @@ Image wholeImageAsOneTile(const Image& in, const std::string& text) {
 
 struct Setting {
     const char* name;
-    std::map<int, int> overrides;  // parameter number -> value
+    std::map<int, std::int32_t> overrides;  // parameter number -> value
 };
 std::ostream& operator<<(std::ostream& os, const Setting& s) { return os << s.name; }
 
 class Seams : public ::testing::TestWithParam<Setting> {};
 
 TEST_P(Seams, TiledRunEqualsOneTileOverTheWholeImage) {
-    static const Module module(NOCTIVA_MODULE_PATH);
-    const std::string text = settings(GetParam().overrides);
+    const std::string text = testsupport::settingsWith(GetParam().overrides);
     // 613 x 457 is three tiles each way, the last ones of odd size.
     for (int depth : {8, 16}) {
         Image tiled = hosttest::patternImage(613, 457, 3, depth, 7);
@@ -91,7 +78,7 @@ TEST_P(Seams, TiledRunEqualsOneTileOverTheWholeImage) {
         RunOptions options;
         options.par1 = text;
         options.failOnLeak = true;
-        const RunResult r = runFilter(module.entry(), tiled, options);
+        const RunResult r = runFilter(testsupport::noctivaModule().entry(), tiled, options);
         ASSERT_TRUE(r.ok()) << r.message();
         EXPECT_EQ(r.tilesServed, 9) << "three rows of three tiles";
         size_t differing = 0;
@@ -112,46 +99,36 @@ INSTANTIATE_TEST_SUITE_P(Stages, Seams,
                                            Setting{"wavelet105", {{50, 105}}}),
                          [](const auto& info) { return std::string(info.param.name); });
 
-}  // namespace
 
-namespace {
-
-// Padded ranges along one axis, computed from the tiling rule: a 200-pixel core with 50 pixels of
-// margin towards each neighbour; what remains from a core's start, if at most 250, is the last tile.
-std::vector<std::pair<int, int>> paddedSpans(int start, int extent) {
-    std::vector<std::pair<int, int>> spans;
-    if (extent <= 250) return {{start, start + extent}};
-    int core = start;
-    while (true) {
-        const int pad0 = core == start ? start : core - 50;
-        if (start + extent - core <= 250) {
-            spans.emplace_back(pad0, start + extent);
-            return spans;
-        }
-        spans.emplace_back(pad0, core + 250);
-        core += 200;
-    }
-}
-
+// The padded spans of the tiling rule along each axis, written out by hand: 200-pixel cores with
+// 50 pixels of margin towards each neighbour; a remainder of at most 250 pixels is the last tile.
+// Rows are walked top to bottom, and each row from the left edge of the area.
 struct Geometry {
     int width, height;
     std::optional<Selection> selection;
+    std::vector<std::pair<int, int>> columns, rows;
 };
 
 TEST(Tiles, TheHostIsAskedForExactlyTheTilesRowByRowAndProgressEndsComplete) {
-    static const Module module(NOCTIVA_MODULE_PATH);
-    const std::vector<Geometry> cases = {
-        {251, 37, {}}, {451, 450, {}}, {1031, 777, {}}, {700, 520, Selection{33, 17, 523, 461}}};
+    using Spans = std::vector<std::pair<int, int>>;
+    const Spans w1031 = {{0, 250}, {150, 450}, {350, 650}, {550, 850}, {750, 1031}};
+    const Geometry cases[] = {
+        {1, 1, {}, {{0, 1}}, {{0, 1}}},
+        {251, 250, {}, {{0, 250}, {150, 251}}, {{0, 250}}},
+        {450, 451, {}, {{0, 250}, {150, 450}}, {{0, 250}, {150, 450}, {350, 451}}},
+        {1031, 37, {}, w1031, {{0, 37}}},
+        // A selection is tiled from its own corner.
+        {700, 520, Selection{13, 37, 451, 260}, {{13, 263}, {163, 463}, {363, 464}}, {{37, 287}, {187, 297}}},
+    };
     for (const auto& g : cases) {
         Image image = hosttest::patternImage(g.width, g.height, 3, 8, 3);
         RunOptions options;
         options.selection = g.selection;
-        const RunResult r = runFilter(module.entry(), image, options);
+        const RunResult r = runFilter(testsupport::noctivaModule().entry(), image, options);
         ASSERT_TRUE(r.ok()) << r.message();
-        const Selection area = g.selection.value_or(Selection{0, 0, g.width, g.height});
         std::vector<pi::Rect16> expected;
-        for (const auto& [top, bottom] : paddedSpans(area.y, area.height))
-            for (const auto& [left, right] : paddedSpans(area.x, area.width))
+        for (const auto& [top, bottom] : g.rows)
+            for (const auto& [left, right] : g.columns)
                 expected.push_back({int16_t(top), int16_t(left), int16_t(bottom), int16_t(right)});
         ASSERT_EQ(r.requestedInRects.size(), expected.size()) << g.width << " x " << g.height;
         for (size_t i = 0; i < expected.size(); ++i) {

@@ -11,12 +11,10 @@
 
 namespace {
 
-// Handles and buffers that count what is alive, and can refuse buffers.
+// Handles and buffers that count what is alive.
 struct BareHost {
     static inline std::map<pi::Handle, std::vector<char>> handles;
     static inline std::map<pi::BufferID, std::vector<char>> buffers;
-    static inline int refuseBuffersFrom = 0;  // 1-based allocation number; 0 = never
-    static inline int bufferAllocations = 0;
 
     static pi::Handle newHandle(pi::int32 size) {
         auto* master = new char*;
@@ -34,7 +32,6 @@ struct BareHost {
     static pi::Ptr lockHandle(pi::Handle h, pi::Boolean) { return *h; }
     static void unlockHandle(pi::Handle) {}
     static pi::OSErr allocateBuffer(pi::int32 size, pi::BufferID* id) {
-        if (++bufferAllocations >= refuseBuffersFrom && refuseBuffersFrom > 0) return pi::memFullErr;
         auto key = reinterpret_cast<pi::BufferID>(new char);
         buffers[key].assign(size_t(size), '\0');
         *id = key;
@@ -73,8 +70,6 @@ protected:
         record.imageHRes = record.imageVRes = 72 << 16;
         pixels.assign(size_t(30) * 20 * 3, 100);
         out = pixels;
-        BareHost::refuseBuffersFrom = 0;
-        BareHost::bufferAllocations = 0;
     }
     void TearDown() override {
         EXPECT_TRUE(BareHost::handles.empty()) << "handles left: " << BareHost::handles.size();
@@ -98,18 +93,6 @@ protected:
         record.outData = out.data() + offset;
     }
     bool empty(const pi::Rect16& r) { return r.top >= r.bottom || r.left >= r.right; }
-    int runToTheEnd() {
-        int continues = 0;
-        if (call(pi::filterSelectorPrepare) != pi::noErr) return -1;
-        if (call(pi::filterSelectorStart) != pi::noErr) return -1;
-        while (!empty(record.inRect) || !empty(record.outRect)) {
-            serve();
-            if (call(pi::filterSelectorContinue) != pi::noErr) return -1;
-            ++continues;
-        }
-        call(pi::filterSelectorFinish);
-        return continues;
-    }
 
     void* library = nullptr;
     PluginEntryProc entry = nullptr;
@@ -132,13 +115,6 @@ TEST_F(Lifecycle, AboutTouchesNeitherCellAndCreatesNothing) {
     data = 0;
 }
 
-TEST_F(Lifecycle, APrepareFirstRunEndsWithAnEmptyDataCellAndTheNextRunStartsFresh) {
-    EXPECT_EQ(runToTheEnd(), 1) << "a 30 x 20 image is one tile";
-    EXPECT_EQ(data, 0);
-    EXPECT_EQ(runToTheEnd(), 1);
-    EXPECT_EQ(data, 0);
-}
-
 TEST_F(Lifecycle, TheObjectLivesInAHandleBetweenCalls) {
     ASSERT_EQ(call(pi::filterSelectorPrepare), pi::noErr);
     ASSERT_NE(data, 0);
@@ -152,32 +128,6 @@ TEST_F(Lifecycle, TheObjectLivesInAHandleBetweenCalls) {
     EXPECT_TRUE(empty(record.inRect) && empty(record.outRect) && empty(record.maskRect));
     call(pi::filterSelectorFinish);
     EXPECT_EQ(data, 0);
-}
-
-TEST_F(Lifecycle, RefusedMemoryEndsTheRunWithOutOfMemoryAndLeavesNothing) {
-    ASSERT_EQ(runToTheEnd(), 1);
-    const int allocations = BareHost::bufferAllocations;
-    ASSERT_GT(allocations, 0);
-    for (int refuse = 1; refuse <= allocations; ++refuse) {
-        BareHost::refuseBuffersFrom = refuse;
-        BareHost::bufferAllocations = 0;
-        const pi::int16 code = [&]() -> pi::int16 {
-            for (pi::int16 s : {pi::filterSelectorPrepare, pi::filterSelectorStart}) {
-                if (call(s) != pi::noErr) return result;
-            }
-            while (!empty(record.inRect)) {
-                serve();
-                if (call(pi::filterSelectorContinue) != pi::noErr) return result;
-            }
-            return pi::noErr;
-        }();
-        EXPECT_EQ(code, pi::memFullErr) << "refusing allocation " << refuse;
-        EXPECT_EQ(data, 0) << "the failed run released its object";
-        call(pi::filterSelectorFinish);  // a host may still end the run
-        EXPECT_EQ(data, 0);
-        EXPECT_TRUE(BareHost::handles.empty());
-        EXPECT_TRUE(BareHost::buffers.empty());
-    }
 }
 
 TEST_F(Lifecycle, WithoutAHandleSuiteTheEntryReportsOutOfMemory) {

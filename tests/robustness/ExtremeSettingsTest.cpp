@@ -43,7 +43,7 @@ void expectCleanRun(const std::string& par1, const Image& original, double& slow
     options.failOnLeak = true;
     options.parentWindow = false;
     const auto start = std::chrono::steady_clock::now();
-    const RunResult result = runFilter(robustness::module().entry(), image, options);
+    const RunResult result = runFilter(robustness::noctivaModule().entry(), image, options);
     const double seconds = std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count();
     if (seconds > slowest) slowest = seconds, slowestName = name;
     EXPECT_TRUE(result.ok()) << result.message();

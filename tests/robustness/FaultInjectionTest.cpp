@@ -53,7 +53,7 @@ TEST_P(FaultSweep, EveryFailingAllocationAndLockEndsCleanly) {
     base.parentWindow = false;
 
     Image clean = original;
-    const RunResult reference = runFilter(robustness::module().entry(), clean, base);
+    const RunResult reference = runFilter(robustness::noctivaModule().entry(), clean, base);
     ASSERT_TRUE(reference.ok()) << reference.message();
     ASSERT_NE(clean, original) << "the run must process something for the sweep to mean anything";
 
@@ -68,7 +68,7 @@ TEST_P(FaultSweep, EveryFailingAllocationAndLockEndsCleanly) {
             RunOptions options = base;
             options.*fault.failAt = int(n);
             Image image = original;
-            const RunResult result = runFilter(robustness::module().entry(), image, options);
+            const RunResult result = runFilter(robustness::noctivaModule().entry(), image, options);
             ++casesRun;
             EXPECT_EQ(result.result, pi::memFullErr) << result.message();
             EXPECT_TRUE(result.hostError.empty()) << result.hostError;
@@ -81,7 +81,7 @@ TEST_P(FaultSweep, EveryFailingAllocationAndLockEndsCleanly) {
         RunOptions options = base;
         options.*fault.failAt = int(total + 1);
         Image image = original;
-        const RunResult result = runFilter(robustness::module().entry(), image, options);
+        const RunResult result = runFilter(robustness::noctivaModule().entry(), image, options);
         EXPECT_TRUE(result.ok()) << fault.name << ": " << result.message();
         EXPECT_TRUE(image == clean) << fault.name;
     }
