@@ -7,6 +7,10 @@
 #include <stdexcept>
 #include <type_traits>
 
+#if defined(__x86_64__)
+#include <immintrin.h>
+#endif
+
 #include "kernel/Lab.h"
 #include "kernel/PixelBlock.h"
 #include "kernel/StageTimer.h"
@@ -209,6 +213,78 @@ struct cKernels {
         mixSpan<S, CH>(in, blur, plane, ch, n, out);
     }
 };
+
+#if defined(__x86_64__) && (defined(__GNUC__) || defined(__clang__))
+// The mix for 8-bit RGB, eight pixels at a time: the compiler cannot interleave the three byte
+// planes into pixels without a long chain of shuffles. Same arithmetic as mixSpan: L / 3 by the
+// multiply-high of 0xAAAAAAAB (exact for every 32-bit L), the rest as written there.
+__attribute__((target("avx2"))) inline __m256i load8(const uint16_t* p) {
+    return _mm256_cvtepu16_epi32(_mm_loadu_si128(reinterpret_cast<const __m128i*>(p)));
+}
+// Clamped to 0..65535, then the 8-bit sample.
+__attribute__((target("avx2"))) inline __m256i clampShift(__m256i v) {
+    return _mm256_srli_epi32(_mm256_min_epi32(_mm256_max_epi32(v, _mm256_setzero_si256()), _mm256_set1_epi32(65535)), 8);
+}
+// Eight pixels from `i`, packed to 24 bytes: the low lane's first 12 bytes, then the high lane's.
+__attribute__((target("avx2"))) inline __m256i mixBlock(const uint16_t* input, const uint16_t* bL, const uint16_t* bA,
+                                                        const uint16_t* bB, int32_t i) {
+    const __m256i magic = _mm256_set1_epi32(int32_t(0xAAAAAAABu));
+    const __m256i x = _mm256_add_epi32(load8(bL + i), _mm256_slli_epi32(load8(input + i), 1));
+    const __m256i even = _mm256_srli_epi64(_mm256_mul_epu32(x, magic), 33);
+    const __m256i odd = _mm256_slli_epi64(_mm256_srli_epi64(_mm256_mul_epu32(_mm256_srli_epi64(x, 32), magic), 33), 32);
+    const __m256i L = _mm256_or_si256(even, odd);
+    const __m256i A = load8(bA + i), B = load8(bB + i);
+    const __m256i p = _mm256_srai_epi32(_mm256_mullo_epi32(A, _mm256_set1_epi32(1365)), 10);
+    const __m256i q = _mm256_srai_epi32(_mm256_mullo_epi32(A, _mm256_set1_epi32(682)), 10);
+    const __m256i Lm = _mm256_sub_epi32(L, _mm256_set1_epi32(10922));
+    const __m256i r = clampShift(_mm256_sub_epi32(_mm256_add_epi32(Lm, p), B));
+    const __m256i g = clampShift(_mm256_sub_epi32(_mm256_add_epi32(Lm, B), q));
+    const __m256i b = clampShift(_mm256_sub_epi32(_mm256_sub_epi32(_mm256_add_epi32(L, _mm256_set1_epi32(54612)), q), B));
+    const __m256i px = _mm256_or_si256(r, _mm256_or_si256(_mm256_slli_epi32(g, 8), _mm256_slli_epi32(b, 16)));
+    // Per 128-bit lane: bytes 0..2 of each 32-bit pixel, packed to the lane's first 12 bytes.
+    const __m256i pack = _mm256_setr_epi8(0, 1, 2, 4, 5, 6, 8, 9, 10, 12, 13, 14, -1, -1, -1, -1,  //
+                                          0, 1, 2, 4, 5, 6, 8, 9, 10, 12, 13, 14, -1, -1, -1, -1);
+    return _mm256_shuffle_epi8(px, pack);
+}
+
+__attribute__((target("avx2"))) void mixRgb8Avx2(const uint16_t* __restrict input, const uint16_t* __restrict blur,
+                                                 size_t plane, int32_t n, uint8_t* __restrict out) {
+    const uint16_t* bL = blur;
+    const uint16_t* bA = blur + plane;
+    const uint16_t* bB = blur + 2 * plane;
+    if (n < 8) {
+        mixSpan<uint8_t, 3>(input, blur, plane, 3, n, out);
+        return;
+    }
+    int32_t i = 0;
+    // Each block stores 16 bytes at its 12th: all but the last block have 4 bytes of room after.
+    for (; i + 10 <= n; i += 8) {
+        const __m256i packed = mixBlock(input, bL, bA, bB, i);
+        uint8_t* o = out + 3 * size_t(i);
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(o), _mm256_castsi256_si128(packed));
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(o + 12), _mm256_extracti128_si256(packed, 1));
+    }
+    if (i < n) {
+        // The last pixels: the block ending at n, through a buffer.
+        const int32_t from = n - 8;
+        const __m256i packed = mixBlock(input, bL, bA, bB, from);
+        alignas(32) uint8_t bytes[32];
+        _mm_store_si128(reinterpret_cast<__m128i*>(bytes), _mm256_castsi256_si128(packed));
+        _mm_storeu_si128(reinterpret_cast<__m128i*>(bytes + 12), _mm256_extracti128_si256(packed, 1));
+        std::memcpy(out + 3 * size_t(i), bytes + 3 * (i - from), 3 * size_t(n - i));
+    }
+}
+
+template <>
+void cKernels<uint8_t, 3>::mix(const uint16_t* in, const uint16_t* blur, size_t plane, int32_t, int32_t n,
+                               uint8_t* out) {
+    static const bool avx2 = __builtin_cpu_supports("avx2");
+    if (avx2)
+        mixRgb8Avx2(in, blur, plane, n, out);
+    else
+        mixSpan<uint8_t, 3>(in, blur, plane, 3, n, out);
+}
+#endif
 
 // What the column passes need to know about a tile.
 struct cColumns {
