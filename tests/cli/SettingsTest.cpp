@@ -88,6 +88,7 @@ TEST(Assignment, AcceptsNamesAndIntegersAndRefusesTheRest) {
         {"step2.mode=0x10", false, "", 0, "is not an integer"},
         {"step9.mode=1", false, "", 0, "unknown parameter \"step9.mode\""},
         {"Parameter58=1", false, "", 0, "unknown parameter"},
+        {"Parameter5x=1", false, "", 0, "unknown parameter"},
         {"step2.mode", false, "", 0, "is not NAME=VALUE"},
     };
     for (const Case& c : cases) {

@@ -24,7 +24,7 @@ namespace {
 struct Chain {
     testsupport::MallocHost host;
     Image image{40, 30, 100, 200};
-    KERNEL::cRGB32PixelBlock* source;
+    KERNEL::cPixelBlock* source;
     TestPipe* p1 = new TestPipe(2, 1);
     TestPipe* p2 = new TestPipe(3, 1);
     TestPipe* p3 = new TestPipe(0, 0);
@@ -32,7 +32,7 @@ struct Chain {
 
     Chain() {
         image.fillRandom(7);
-        source = image.block({100, 140, 200, 230}, {110, 130, 210, 220});
+        source = image.block({100, 140, 200, 230}, {110, 130, 210, 220}).release();
         source->AddRef();  // the test's own reference, so the block outlives the chain
         composite->SetNode(p3->Chain(p2)->Append(p1)->Terminate(source));
     }
@@ -148,7 +148,7 @@ TEST(Graph, OwnershipIsLeakFree) {
     {
         testsupport::MallocHost host;
         Image image(20, 20);
-        auto* source = image.block();
+        auto* source = image.block().release();
         auto composite = std::make_unique<cComposite>();
         composite->SetNode((new TestPipe(1, 1))->Chain(new TestPipe(1, 1))->Append(new TestPipe(0, 0))->Terminate(source));
         EXPECT_EQ(graphtest::liveComponents(), before + 3);
@@ -156,7 +156,7 @@ TEST(Graph, OwnershipIsLeakFree) {
         composite->Evaluate();
         EXPECT_GT(host.liveBuffers(), 0u);
         // A new chain replaces the old one: the old nodes and their fronts go.
-        auto* source2 = image.block();
+        auto* source2 = image.block().release();
         composite->SetNode((new TestPipe(0, 0))->Chain(new TestPipe(0, 0))->Terminate(source2));
         EXPECT_EQ(graphtest::liveComponents(), before + 2);
         EXPECT_EQ(host.liveBuffers(), 0u);
@@ -174,7 +174,7 @@ TEST(Graph, ExceptionInProcessRestoresRectanglesAndLeaksNothing) {
     };
     testsupport::MallocHost host;
     Image image(20, 20);
-    auto* source = image.block({0, 20, 0, 20}, {5, 15, 5, 15});
+    auto* source = image.block({0, 20, 0, 20}, {5, 15, 5, 15}).release();
     source->AddRef();
     {
         cComposite composite;
@@ -191,7 +191,7 @@ TEST(Graph, ExceptionInProcessRestoresRectanglesAndLeaksNothing) {
 TEST(Graph, ShareUpstreamTakesAnEqualKeyedNodeWithoutOwningIt) {
     testsupport::MallocHost host;
     Image image(10, 10);
-    auto* source = image.block();
+    auto* source = image.block().release();
     auto* a = new TestPipe(0, 0);
     auto* b = new TestPipe(0, 0);
     // Two chains over the same fronts: b <- a <- source, twice.
@@ -231,7 +231,7 @@ struct ActionChain {
 
 // Applies the chain tile by tile (core `tile`, overlap `overlap`, both clipped to the image).
 void applyTiled(ActionChain& c, Image& in, Image& out, int32_t tile, int32_t overlap) {
-    std::unique_ptr<KERNEL::cPixelBlock> dst(out.block());
+    auto dst = out.block();
     for (int32_t y = in.y; y < in.y + in.height; y += tile)
         for (int32_t x = in.x; x < in.x + in.width; x += tile) {
             const cRect core{int16_t(x), int16_t(std::min(x + tile, in.x + in.width)), int16_t(y),
@@ -240,7 +240,7 @@ void applyTiled(ActionChain& c, Image& in, Image& out, int32_t tile, int32_t ove
                               int16_t(std::min(core.x1 + overlap, in.x + in.width)),
                               int16_t(std::max(y - overlap, in.y)),
                               int16_t(std::min(core.y1 + overlap, in.y + in.height))};
-            std::unique_ptr<KERNEL::cPixelBlock> src(in.block(outer, core));
+            auto src = in.block(outer, core);
             c.action->Apply(src.get(), dst.get());
         }
 }
@@ -254,7 +254,8 @@ TEST(GraphAction, TiledEqualsWholeBlockPixelForPixel) {
     Image whole(173, 151, 30, 40), tiled(173, 151, 30, 40);
     {
         ActionChain c(k);
-        std::unique_ptr<KERNEL::cPixelBlock> src(in.block()), dst(whole.block());
+        auto src = in.block();
+        auto dst = whole.block();
         c.action->Apply(src.get(), dst.get());
         EXPECT_EQ(c.p1->calls, 1);
     }
@@ -276,9 +277,9 @@ TEST(GraphAction, SameTileTwiceComputesOnceAndANewTileRecomputes) {
     ActionChain c(2);
     Image in(60, 60), out(60, 60);
     in.fillRandom(5);
-    std::unique_ptr<KERNEL::cPixelBlock> dst(out.block());
-    std::unique_ptr<KERNEL::cPixelBlock> a(in.block({0, 60, 0, 60}, {10, 40, 10, 40}));
-    std::unique_ptr<KERNEL::cPixelBlock> b(in.block({0, 60, 0, 60}, {20, 50, 10, 40}));
+    auto dst = out.block();
+    auto a = in.block({0, 60, 0, 60}, {10, 40, 10, 40});
+    auto b = in.block({0, 60, 0, 60}, {20, 50, 10, 40});
     c.action->Apply(a.get(), dst.get());
     c.action->Apply(a.get(), dst.get());
     EXPECT_EQ(c.p1->calls, 1);
@@ -299,7 +300,8 @@ TEST(GraphAction, ApplyWritesOnlyTheCoreAndNothingWhenDisabled) {
     Image in(30, 30), out(30, 30);
     in.fillRandom(8);
     std::fill(out.samples.begin(), out.samples.end(), -7);
-    std::unique_ptr<KERNEL::cPixelBlock> src(in.block({0, 30, 0, 30}, {5, 20, 8, 25})), dst(out.block());
+    auto src = in.block({0, 30, 0, 30}, {5, 20, 8, 25});
+    auto dst = out.block();
     c.action->Disable();
     c.action->Apply(src.get(), dst.get());
     EXPECT_EQ(c.p1->calls, 0);

@@ -1,46 +1,17 @@
-// Shared pieces of the graph tests: working-block images over test memory and small test pipes.
+// Shared pieces of the graph tests: small test pipes that count what they see.
 #pragma once
 
 #include <algorithm>
 #include <cstdint>
-#include <random>
-#include <vector>
 
 #include "kernel/Component.h"
 #include "kernel/Node.h"
-#include "kernel/PixelBlock.h"
+#include "support/WorkingImage.h"
 
 namespace graphtest {
 
-// A 32-bit RGB image in test memory; blocks made from it wrap it without owning it.
-struct Image {
-    int32_t width = 0, height = 0, x = 0, y = 0;
-    std::vector<int32_t> samples;
-
-    Image(int32_t w, int32_t h, int32_t x0 = 0, int32_t y0 = 0)
-        : width(w), height(h), x(x0), y(y0), samples(size_t(w) * h * 3, 0) {}
-    int32_t* at(int32_t ix, int32_t iy) { return &samples[(size_t(iy - y) * width + (ix - x)) * 3]; }
-    uint32_t rowBytes() const { return uint32_t(width) * 12; }
-
-    void fillRandom(uint32_t seed, int32_t lo = 0, int32_t hi = 65535) {
-        std::mt19937 rng(seed);
-        std::uniform_int_distribution<int32_t> d(lo, hi);
-        for (auto& s : samples) s = d(rng);
-    }
-    // A block over the part `outer` of this image, processing `inner`.
-    KERNEL::cRGB32PixelBlock* block(const KERNEL::cRect& outer, const KERNEL::cRect& inner) {
-        return new KERNEL::cRGB32PixelBlock(reinterpret_cast<uint8_t*>(at(outer.x0, outer.y0)), outer, inner, 4, 12,
-                                            1, KERNEL::kModeRGB32, rowBytes());
-    }
-    KERNEL::cRGB32PixelBlock* block() {
-        const KERNEL::cRect r{int16_t(x), int16_t(x + width), int16_t(y), int16_t(y + height)};
-        return block(r, r);
-    }
-};
-
-inline KERNEL::cRect widened(KERNEL::cRect r, int32_t bx, int32_t by) {
-    return {int16_t(r.x0 - bx), int16_t(r.x1 + bx), int16_t(r.y0 - by), int16_t(r.y1 + by)};
-}
+using Image = testsupport::WorkingImage;
+using testsupport::widened;
 
 // Counts front components alive, to prove the graph deletes what it was given.
 inline int& liveComponents() {

@@ -32,7 +32,9 @@ TEST(Lab, GoldenRoundTripThroughTheBlocks) {
     for (size_t i = 0; i < std::size(kGolden); ++i)
         for (int k = 0; k < 3; ++k) image.at(int32_t(i), 0)[k] = kGolden[i].rgb[k];
     Image lab(image.width, 1), back(image.width, 1);
-    std::unique_ptr<KERNEL::cPixelBlock> src(image.block()), mid(lab.block()), out(back.block());
+    auto src = image.block();
+    auto mid = lab.block();
+    auto out = back.block();
     cRGB2LAB().Process(src.get(), mid.get());
     cLAB2RGB().Process(mid.get(), out.get());
     for (size_t i = 0; i < std::size(kGolden); ++i) {
@@ -99,8 +101,9 @@ TEST(Lab, RectanglesPastTheStoredEdgeMatchTheCursorWalk) {
             fast.fillRandom(4);
             slow.samples = fast.samples;
             const cRect outer{0, 12, 0, 10};
-            std::unique_ptr<KERNEL::cPixelBlock> src(in.block(outer, inner)), a(fast.block(outer, inner)),
-                b(slow.block(outer, inner));
+            auto src = in.block(outer, inner);
+            auto a = fast.block(outer, inner);
+            auto b = slow.block(outer, inner);
             if (forward)
                 cRGB2LAB().Process(src.get(), a.get());
             else

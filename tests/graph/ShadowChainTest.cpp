@@ -1,5 +1,6 @@
-// The shadow chain: its parameter text (order, defaults, reading rules, bounds), the parameter table,
-// borders, the bypassed chain as the Lab round trip, and ownership.
+// The shadow chain: its parameter text (every field by number, reading rules, bounds), borders, the
+// bypassed chain as the Lab round trip, and ownership. The defaults and their order are checked
+// through the module (tests/e2e).
 #include <gtest/gtest.h>
 
 #include <memory>
@@ -70,65 +71,6 @@ struct Shadow {
         return f;
     }
 };
-
-struct Entry {
-    std::string name;
-    int32_t value;
-};
-
-// Splits " name value  name value " strictly: every entry is blank, name, blank, value, blank.
-std::vector<Entry> parseEntries(const std::string& text) {
-    std::vector<Entry> entries;
-    size_t i = 0;
-    while (i < text.size()) {
-        EXPECT_EQ(text[i], ' ');
-        const size_t nameEnd = text.find(' ', i + 1);
-        const size_t valueEnd = text.find(' ', nameEnd + 1);
-        if (nameEnd == std::string::npos || valueEnd == std::string::npos) {
-            ADD_FAILURE() << "unterminated entry at " << i;
-            break;
-        }
-        entries.push_back({text.substr(i + 1, nameEnd - i - 1), std::stoi(text.substr(nameEnd + 1, valueEnd - nameEnd - 1))});
-        i = valueEnd + 1;
-    }
-    return entries;
-}
-
-TEST(ShadowChain, WritesFiftyEightEntriesInOrderWithTheDefaults) {
-    Shadow s;
-    const std::string text = writeShadowParameters(*s.action);
-    const auto entries = parseEntries(text);
-    const auto table = shadowParameterTable();
-    ASSERT_EQ(entries.size(), kShadowParameterCount);
-    ASSERT_EQ(table.size(), kShadowParameterCount);
-    for (size_t i = 0; i < entries.size(); ++i) {
-        SCOPED_TRACE(i);
-        EXPECT_EQ(entries[i].name, "Parameter" + std::to_string(i));
-        EXPECT_EQ(entries[i].value, table[i].defaultValue) << table[i].name;
-        EXPECT_EQ(table[i].number, int32_t(i));
-    }
-    EXPECT_EQ(entries[50].value, 104);
-    EXPECT_EQ(entries[14].value, 0);
-    EXPECT_EQ(entries[33].value, 0);
-    EXPECT_EQ(entries[57].value, 0);
-    EXPECT_LE(text.size(), s.action->ParameterTextLength());
-    EXPECT_EQ(text.substr(0, 15), " Parameter0 0  ");
-}
-
-TEST(ShadowChain, TableNamesTheFieldsTheTextCarries) {
-    Shadow s;
-    const auto table = shadowParameterTable();
-    EXPECT_STREQ(table[50].name, "step2.mode");
-    EXPECT_EQ(findShadowParameter("step1.mode"), &table[57]);
-    EXPECT_EQ(findShadowParameter("Parameter5"), &table[5]);
-    EXPECT_EQ(findShadowParameter("Parameter58"), nullptr);
-    EXPECT_EQ(findShadowParameter("Parameter5x"), nullptr);
-    EXPECT_EQ(findShadowParameter("step9.mode"), nullptr);
-    for (size_t i = 0; i < table.size(); ++i) {
-        SCOPED_TRACE(table[i].name);
-        EXPECT_EQ(*s.field(int(i)), table[i].defaultValue);
-    }
-}
 
 TEST(ShadowChain, ReadingBackReproducesEveryField) {
     Shadow a;
@@ -218,7 +160,8 @@ TEST(ShadowChain, BordersPerNodeAndTheWideVariant) {
         Shadow s;
         s.step2->mode = mode;
         Image in(20, 20), out(20, 20);
-        std::unique_ptr<KERNEL::cPixelBlock> src(in.block()), dst(out.block());
+        auto src = in.block();
+        auto dst = out.block();
         s.action->Apply(src.get(), dst.get());
         const int32_t wide = mode == 108 ? 10 : 0;
         // From the final node (step 4) to the input node.
@@ -244,7 +187,8 @@ TEST(ShadowChain, AllStepsBypassedIsTheLabRoundTrip) {
     std::copy(white, white + 3, in.at(10, 12));
     std::fill(out.samples.begin(), out.samples.end(), -9);
     const cRect core{8, 40, 11, 30};
-    std::unique_ptr<KERNEL::cPixelBlock> src(in.block({5, 42, 9, 32}, core)), dst(out.block());
+    auto src = in.block({5, 42, 9, 32}, core);
+    auto dst = out.block();
     s.action->Apply(src.get(), dst.get());
     for (int32_t y = 9; y < 32; ++y)
         for (int32_t x = 5; x < 42; ++x) {
@@ -264,7 +208,8 @@ TEST(ShadowChain, StepModeFromTheTextActivatesTheStep) {
     Shadow s;
     s.step2->mode = 0;
     Image in(16, 16), out(16, 16);
-    std::unique_ptr<KERNEL::cPixelBlock> src(in.block()), dst(out.block());
+    auto src = in.block();
+    auto dst = out.block();
     s.action->Apply(src.get(), dst.get());
     const size_t cached = s.host.liveBuffers();
     // A complete text: alone, "Parameter57" would be taken by the search for "Parameter5".
@@ -287,7 +232,8 @@ TEST(ShadowChain, DeletingTheActionDeletesStepsConvertersAndBuffers) {
         EXPECT_EQ(s.step2->RefCount(), 1);
         Image in(64, 48), out(64, 48);
         in.fillRandom(2);
-        std::unique_ptr<KERNEL::cPixelBlock> src(in.block({0, 64, 0, 48}, {10, 54, 10, 38})), dst(out.block());
+        auto src = in.block({0, 64, 0, 48}, {10, 54, 10, 38});
+        auto dst = out.block();
         s.action->Apply(src.get(), dst.get());
         s.action.reset();
         EXPECT_EQ(stepsAlive(), before);
