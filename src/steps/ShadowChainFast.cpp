@@ -34,7 +34,11 @@ constexpr int32_t kR = 6;
 constexpr int32_t kN = 2 * kR + 1;
 constexpr int32_t kStep2Border = 20;
 constexpr int32_t kLabBorder = 30;
-constexpr int32_t kColumnChunk = 32;  // columns per vertical sweep: its scratch stays in L1/L2
+// Values per vertical sweep (a row holds three per pixel): the scratch stays in L1/L2. Several
+// threads take half as many, so that a tile has a dozen chunks to share evenly; each chunk costs
+// its own start-up sums.
+constexpr int32_t kChunkValues = 96;
+constexpr int32_t kSharedChunkValues = 48;
 
 inline int32_t clampIndex(int64_t v, int32_t size) { return int32_t(v < 0 ? 0 : (v >= size ? size - 1 : v)); }
 
@@ -303,7 +307,7 @@ struct cColumns {
 template <size_t NW>
 NOCTIVA_AVX2_CLONES void columnChunk(const cColumns& t, int32_t x0, size_t nRun, int32_t* scratch) {
     const size_t n = NW != 0 ? NW : nRun;
-    constexpr size_t K3 = 3 * size_t(kColumnChunk);
+    constexpr size_t K3 = size_t(kChunkValues);
     int32_t* __restrict col = scratch;                                   // first pass, rows v1i0 .. v1i1
     int32_t* __restrict sums = scratch + K3 * size_t(t.v1i1 - t.v1i0);  // running sums
     uint16_t* const rows = t.rows;
@@ -482,18 +486,20 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
 
     // Columns, in chunks of a row's values: both column passes; the result replaces the chunk's own
     // values of the core rows in `rows`, which no other chunk reads.
-    constexpr int32_t kChunkValues = 3 * kColumnChunk;
     const int32_t values = int32_t(rowStride);
-    const int32_t chunks = (values + kChunkValues - 1) / kChunkValues;
+    const int32_t chunkValues = pool.Threads() > 1 ? kSharedChunkValues : kChunkValues;
+    const int32_t chunks = (values + chunkValues - 1) / chunkValues;
     const cColumns cv{rows, rowStride, g.H, v1i0, v1i1, v2i0, v2i1, &v1, &v2, v1Special, v2Special};
     auto columnsPart = [&](int part, int32_t b, int32_t e) {
         std::vector<int32_t>& buf = lines[size_t(part)];
         grow(buf, size_t(kChunkValues) * size_t(v1i1 - v1i0 + 1));
         for (int32_t chunk = b; chunk < e; ++chunk) {
-            const int32_t x0 = chunk * kChunkValues;
-            const int32_t x1 = std::min(x0 + kChunkValues, values);
+            const int32_t x0 = chunk * chunkValues;
+            const int32_t x1 = std::min(x0 + chunkValues, values);
             if (x1 - x0 == kChunkValues)
                 columnChunk<kChunkValues>(cv, x0, 0, buf.data());
+            else if (x1 - x0 == kSharedChunkValues)
+                columnChunk<kSharedChunkValues>(cv, x0, 0, buf.data());
             else
                 columnChunk<0>(cv, x0, size_t(x1 - x0), buf.data());
         }
@@ -539,7 +545,7 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
         };
         phase(KERNEL::timing::kFastRows, r1 - r0, 8, rowsPart, false);
         phase(KERNEL::timing::kFastColumns, chunks, 1, columnsPart, false);
-        phase(KERNEL::timing::kFastMix, v2i1 - v2i0, 16, mixPart, true);
+        phase(KERNEL::timing::kFastMix, v2i1 - v2i0, 8, mixPart, true);
     });
 }
 
