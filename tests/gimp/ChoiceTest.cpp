@@ -1,11 +1,8 @@
 // The preset or settings text a script or the dialog picks, and what is remembered between runs.
 #include <gtest/gtest.h>
 
-#include <set>
-
 #include "Choice.h"
 #include "Presets.h"
-#include "steps/ParameterTable.h"
 
 namespace {
 
@@ -55,28 +52,6 @@ TEST(GimpChoice, DamagedRememberedValuesReadAsNone) {
     std::vector<char> hugeLength = good;
     hugeLength[4] = hugeLength[5] = hugeLength[6] = hugeLength[7] = char(0xff);
     EXPECT_FALSE(decodeChoice(hugeLength));
-}
-
-// Every preset text is a complete text the module reads as written: 58 entries in order, the
-// defaults except where the preset says otherwise.
-TEST(GimpChoice, PresetTextsAreCompleteAndCarryTheirChanges) {
-    std::set<std::string> names;
-    for (const host::Preset& p : host::presets()) {
-        EXPECT_TRUE(names.insert(p.name).second) << "duplicate " << p.name;
-        const std::string text = host::presetSettingsText(p);
-        ASSERT_EQ(text.rfind("vek ", 0), 0u) << p.name;
-        std::string expected = "vek ";
-        for (const cParameterInfo& info : shadowParameterTable()) {
-            std::int32_t value = info.defaultValue;
-            for (const host::PresetChange& c : p.changes)
-                if (findShadowParameter(c.parameter) == &info) value = c.value;
-            expected += " Parameter" + std::to_string(info.number) + " " + std::to_string(value) + " ";
-        }
-        EXPECT_EQ(text, expected) << p.name;
-        for (const host::PresetChange& c : p.changes)
-            EXPECT_NE(findShadowParameter(c.parameter), nullptr) << p.name << ": " << c.parameter;
-    }
-    EXPECT_TRUE(names.count("default"));
 }
 
 }  // namespace

@@ -74,19 +74,6 @@ TEST(FakeModule, Par1AndDResReachTheModuleAndPar1ComesBack) {
     EXPECT_EQ(result.par1Out, "tiles=1 moves=0 dres=3 colors=0 got=op=copy hello");
 }
 
-TEST(FakeModule, RelocationMovesTheFilterObjectBetweenCalls) {
-    for (const bool relocate : {false, true}) {
-        Image image = hosttest::patternImage(10, 10, 3, 8);
-        RunOptions options;
-        options.relocateHandles = relocate;
-        const RunResult result = runFake(image, "tile=4", options);
-        ASSERT_TRUE(result.ok()) << result.message();
-        // Prepare, Start, 9 Continues, Finish: the object can move before each of the 11 later calls.
-        EXPECT_EQ(result.par1Out.rfind(relocate ? "tiles=9 moves=11 " : "tiles=9 moves=0 ", 0), 0u) << result.par1Out;
-        EXPECT_EQ(result.handleMoves > 0, relocate);
-    }
-}
-
 TEST(FakeModule, ModuleErrorCodesAreReportedWithTheirMeaning) {
     Image image = hosttest::patternImage(4, 4, 3, 8);
     const RunResult result = runFake(image, "fail=-30100");

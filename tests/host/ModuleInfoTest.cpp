@@ -201,33 +201,18 @@ private:
 }  // namespace
 
 #ifdef NOCTIVA_MODULE_PATH
+// The PIPL's bytes are compared in tests/plugin; here is what the host makes of them and of the AETE.
 TEST(ModuleInfo, RealModuleDeclaresHiddenRgbFilterWithOneTextParameter) {
     const ModuleInfo info = readModuleInfo(NOCTIVA_MODULE_PATH);
-    EXPECT_EQ(info.kind, pi::fourCC("8BFM"));
     EXPECT_EQ(info.name, "Noctiva...");
-    EXPECT_EQ(info.category, "**Hidden**");
     EXPECT_TRUE(info.hidden());
-    EXPECT_EQ(info.versionMajor, 4);
-    EXPECT_EQ(info.versionMinor, 0);
     EXPECT_EQ(info.entryPoint, "ENTRYPOINT");
-    ASSERT_TRUE(info.terminology);
-    EXPECT_EQ(info.terminology->classId, pi::fourCC("qv06"));
-    EXPECT_EQ(info.terminology->eventId, pi::fourCC("qv06"));
-    EXPECT_EQ(info.terminology->terminologyId, 16013);
-    EXPECT_EQ(info.terminology->scope, "");
     EXPECT_TRUE(info.supportsFilterLayers());
-    ASSERT_TRUE(info.filterCases);
-    for (const FilterCaseInfo& c : *info.filterCases) {
-        EXPECT_EQ(c.inputHandling, 1);
-        EXPECT_EQ(c.outputHandling, 1);
-        EXPECT_EQ(c.flags1, 0x06);
-        EXPECT_EQ(c.flags2, 0);
-    }
+    ASSERT_TRUE(info.terminology);
+    EXPECT_EQ(info.terminology->terminologyId, 16013);
     // The flags name 8-bit RGB only; the expression adds 16-bit RGB.
     EXPECT_TRUE(info.modeFlagged(pi::plugInModeRGBColor));
     EXPECT_FALSE(info.modeFlagged(pi::plugInModeRGB48));
-    ASSERT_TRUE(info.enable);
-    EXPECT_EQ(info.enable->text(), "in (PSHOP_ImageMode, RGBMode, RGB48Mode)");
     EXPECT_TRUE(info.supportsMode(pi::plugInModeRGBColor, 8));
     EXPECT_TRUE(info.supportsMode(pi::plugInModeRGB48, 16));
     for (pi::int16 refused : {pi::plugInModeGrayScale, pi::plugInModeGray16, pi::plugInModeCMYKColor,

@@ -156,34 +156,6 @@ TEST(Session, OutputStartsAsTheDestinationAndOnlyRequestedPlanesGoBack) {
             }
 }
 
-// A later tile's margin lies over an earlier tile's core: the host must hand the current
-// destination, so writing the margin back unchanged keeps the earlier core.
-TEST(Session, EarlierCoresSurviveALaterTilesMargin) {
-    Image image = hosttest::patternImage(6, 1, 3, 8);
-    const Image original = image;
-    int tile = 0;
-    script() = [&](pi::int16 sel, pi::FilterRecord* r, intptr_t*, pi::int16*) {
-        const pi::Rect16 tiles[] = {rect(0, 0, 1, 5), rect(0, 2, 1, 6)};  // cores [0,3) and [3,6)
-        const int coreLeft[] = {0, 3}, coreRight[] = {3, 6};
-        if (sel == pi::filterSelectorStart) {
-            r->inRect = r->outRect = tiles[0];
-            r->inHiPlane = r->outHiPlane = 2;
-        } else if (sel == pi::filterSelectorContinue) {
-            for (int x = coreLeft[tile]; x < coreRight[tile]; ++x)
-                for (int p = 0; p < 3; ++p) {
-                    auto* out = static_cast<unsigned char*>(r->outData) + (x - r->outRect.left) * 3 + p;
-                    const auto* in = static_cast<const unsigned char*>(r->inData) + (x - r->inRect.left) * 3 + p;
-                    *out = static_cast<unsigned char>(255 - *in);
-                }
-            ++tile;
-            r->inRect = r->outRect = tile < 2 ? tiles[tile] : rect(0, 0, 0, 0);
-        }
-    };
-    ASSERT_TRUE(runFilter(scriptedEntry, image).ok());
-    for (int x = 0; x < 6; ++x)
-        for (int p = 0; p < 3; ++p) EXPECT_EQ(image.at(x, 0, p), 255 - original.at(x, 0, p)) << x;
-}
-
 TEST(Session, NothingOutsideTheSelectionChanges) {
     Image image = hosttest::patternImage(9, 7, 3, 16);
     const Image original = image;

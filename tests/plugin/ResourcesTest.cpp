@@ -1,5 +1,6 @@
-// The resources found in the module file, checked against a layout assembled here by hand from the
-// resource tables (not from the module's own generator).
+// The PIPL found in the module file, checked against a layout assembled here by hand from the
+// resource tables (not from the module's own generator). The AETE is read back through the host's
+// parser in tests/host (ModuleInfo.RealModule...).
 #include <gtest/gtest.h>
 
 #include <cstdio>
@@ -62,47 +63,5 @@ Bytes dumpSection(const std::string& name) {
 }
 
 TEST(Resources, PIPLSectionMatchesTheTable) { EXPECT_EQ(dumpSection("PIPL"), expectedPIPL()); }
-
-TEST(Resources, AETESectionDeclaresOneEventWithTheTextParameter) {
-    const Bytes aete = dumpSection("AETE");
-    ASSERT_GT(aete.size(), 20u);
-    Assembler head;
-    head.u16(1), head.u8(1), head.u8(0), head.u16(0), head.u16(0), head.u16(1);
-    ASSERT_TRUE(std::equal(head.b.begin(), head.b.end(), aete.begin()));
-    // Walk the suite: two vendor strings, then the codes the host checks.
-    size_t p = head.b.size();
-    auto skipPstr = [&] { p += 1 + aete.at(p); };
-    auto u16at = [&](size_t at) { return int(aete.at(at) | aete.at(at + 1) << 8); };
-    auto codeAt = [&](size_t at) { return std::string{char(aete.at(at + 3)), char(aete.at(at + 2)), char(aete.at(at + 1)), char(aete.at(at))}; };
-    skipPstr(), skipPstr();
-    EXPECT_EQ(codeAt(p), "qv06");
-    EXPECT_EQ(u16at(p + 4), 1) << "level";
-    EXPECT_EQ(u16at(p + 6), 1) << "version";
-    EXPECT_EQ(u16at(p + 8), 1) << "one event";
-    p += 10;
-    ASSERT_EQ(std::string(aete.begin() + long(p) + 1, aete.begin() + long(p) + 1 + aete[p]), "Noctiva");
-    skipPstr(), skipPstr();
-    EXPECT_EQ(codeAt(p), "qv06");
-    EXPECT_EQ(codeAt(p + 4), "qv06");
-    EXPECT_EQ(codeAt(p + 8), "null");
-    EXPECT_EQ(aete.at(p + 12), 0) << "empty reply description";
-    EXPECT_EQ(u16at(p + 13), 0);
-    EXPECT_EQ(codeAt(p + 15), "#ImR");
-    EXPECT_EQ(aete.at(p + 19), 0);
-    EXPECT_EQ(u16at(p + 20), 0xB000);
-    EXPECT_EQ(u16at(p + 22), 1) << "one further parameter";
-    p += 24;
-    ASSERT_EQ(std::string(aete.begin() + long(p) + 1, aete.begin() + long(p) + 1 + aete[p]), "Parameter 1");
-    skipPstr();
-    EXPECT_EQ(codeAt(p), "par1");
-    EXPECT_EQ(codeAt(p + 4), "TEXT");
-    EXPECT_EQ(aete.at(p + 8), 0);
-    EXPECT_EQ(u16at(p + 9), 0);
-    p += 11;
-    EXPECT_EQ(aete.size(), p + 6) << "no classes, comparison operators or enumerations follow";
-    EXPECT_EQ(u16at(p), 0);
-    EXPECT_EQ(u16at(p + 2), 0);
-    EXPECT_EQ(u16at(p + 4), 0);
-}
 
 }  // namespace
