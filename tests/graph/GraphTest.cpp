@@ -213,7 +213,8 @@ TEST(Graph, ShareUpstreamTakesAnEqualKeyedNodeWithoutOwningIt) {
     EXPECT_EQ(host.liveBuffers(), 0u);
 }
 
-// ---- Through the filter action: tiles, caching across Apply, no seams.
+// ---- Through the filter action: caching across Apply, writing the core. Seams between tiles are
+// checked through the module (tests/e2e, Seams).
 
 struct ActionChain {
     std::unique_ptr<cRGB32FilterAction> action = std::make_unique<cRGB32FilterAction>();
@@ -228,49 +229,6 @@ struct ActionChain {
                             ->Terminate(action->GetSourceBlock()));
     }
 };
-
-// Applies the chain tile by tile (core `tile`, overlap `overlap`, both clipped to the image).
-void applyTiled(ActionChain& c, Image& in, Image& out, int32_t tile, int32_t overlap) {
-    auto dst = out.block();
-    for (int32_t y = in.y; y < in.y + in.height; y += tile)
-        for (int32_t x = in.x; x < in.x + in.width; x += tile) {
-            const cRect core{int16_t(x), int16_t(std::min(x + tile, in.x + in.width)), int16_t(y),
-                             int16_t(std::min(y + tile, in.y + in.height))};
-            const cRect outer{int16_t(std::max(x - overlap, in.x)),
-                              int16_t(std::min(core.x1 + overlap, in.x + in.width)),
-                              int16_t(std::max(y - overlap, in.y)),
-                              int16_t(std::min(core.y1 + overlap, in.y + in.height))};
-            auto src = in.block(outer, core);
-            c.action->Apply(src.get(), dst.get());
-        }
-}
-
-TEST(GraphAction, TiledEqualsWholeBlockPixelForPixel) {
-    testsupport::MallocHost host;
-    const int32_t k = 8;  // two stages of reach 8: the core needs 2k of real input, well inside the overlap of 50
-    Image in(173, 151, 30, 40);
-    in.fillRandom(11);
-
-    Image whole(173, 151, 30, 40), tiled(173, 151, 30, 40);
-    {
-        ActionChain c(k);
-        auto src = in.block();
-        auto dst = whole.block();
-        c.action->Apply(src.get(), dst.get());
-        EXPECT_EQ(c.p1->calls, 1);
-    }
-    for (int32_t tile : {50, 64, 200}) {
-        SCOPED_TRACE(tile);
-        std::fill(tiled.samples.begin(), tiled.samples.end(), -1);
-        ActionChain c(k);
-        applyTiled(c, in, tiled, tile, 50);
-        ASSERT_EQ(tiled.samples, whole.samples);
-    }
-    EXPECT_EQ(host.liveBuffers(), 0u);
-
-    // The chain is not the identity, or the comparison would prove little.
-    EXPECT_NE(whole.samples, in.samples);
-}
 
 TEST(GraphAction, SameTileTwiceComputesOnceAndANewTileRecomputes) {
     testsupport::MallocHost host;

@@ -65,16 +65,6 @@ TEST(LanguageChoice, FollowsTheTable) {
     }
 }
 
-TEST_F(CatalogTest, KoreanFromTheSettingsFile) {
-    {
-        vek::SettingsConfigFile settings;
-        ASSERT_TRUE(settings.setProperty("Language", "Language", "ko"));
-    }
-    EXPECT_EQ(ConfiguredLanguage().regionCode(), "ko:kr");
-    LoadCatalogText(titleCatalogue({{"en:us", "Title"}, {"ko:kr", "제목"}}), "@T");
-    EXPECT_EQ(Translate("@T.Dialog.Title"), L"제목");
-}
-
 // Catalogues loaded into an en:us catalogue (unless `language` is set): how many keys they add and
 // what one key translates to.
 TEST_F(CatalogTest, LoadingAndLookupRules) {
@@ -120,12 +110,6 @@ TEST_F(CatalogTest, TextBeforeTheDeclarationIsSkipped) {
     ASSERT_TRUE(LoadCatalogFile(temp.path() / "lead.loc", "@T"));
     EXPECT_EQ(Translate("@T.Dialog.Title"), L"Hello");
     EXPECT_FALSE(LoadCatalogFile(temp.path() / "missing.loc", "@T"));
-}
-
-TEST_F(CatalogTest, LineBreaksAndTabsDropSpacesStayBackslashNBreaks) {
-    CreateCatalog(Language{});
-    LoadCatalogText(titleCatalogue({{"en:us", "  One\r\n\ttwo <!-- note --> three \\nfour\\\\n  "}}), "@T");
-    EXPECT_EQ(Translate("@T.Dialog.Title"), L"  Onetwo  three \nfour\\\n  ");
 }
 
 TEST_F(CatalogTest, KeysThatAreNotFoundComeBackAsTheyAre) {

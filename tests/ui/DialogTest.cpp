@@ -139,6 +139,8 @@ TEST_F(DialogTest, ATickedBoxEndsTheDialogWith5113WhateverWasPressed) {
     }
 }
 
+// A tick remembered and the next run silent, and no tick leaving the settings alone, are checked
+// through the host in ReportEndToEnd; here the cases a run cannot reach.
 TEST_F(DialogTest, ShowWarningRemembersOnlyATick) {
     DialogSettingsStore store;
     wxConfigBase* settings = wxConfigBase::Get(false);
@@ -151,38 +153,15 @@ TEST_F(DialogTest, ShowWarningRemembersOnlyATick) {
     EXPECT_EQ(kind, 0);
     EXPECT_EQ(settings->GetNumberOfEntries(), 0u);
 
-    // Not ticked: shown, nothing written.
+    // An explicit true is left alone; a tick then turns it off.
+    settings->Write("ShowSomething", true);
     endNextDialog(false, wxID_OK, [&](MessageDialog& d) { kind = d.Kind(); });
     EXPECT_EQ(ShowWarning(nullptr, "Message", "ShowSomething"), wxID_OK);
     EXPECT_EQ(kind, 1);
-    EXPECT_FALSE(settings->HasEntry("ShowSomething"));
-
-    // An explicit true is left alone as well.
-    settings->Write("ShowSomething", true);
-    endNextDialog(false, wxID_OK);
-    EXPECT_EQ(ShowWarning(nullptr, "Message", "ShowSomething"), wxID_OK);
     EXPECT_TRUE(settings->ReadBool("ShowSomething", false));
-
-    // Ticked: 5113, remembered, and the next call shows nothing.
     endNextDialog(true, wxID_OK);
     EXPECT_EQ(ShowWarning(nullptr, "Message", "ShowSomething"), kNotAgainResult);
-    EXPECT_FALSE(settings->ReadBool("ShowSomething", true));
     EXPECT_EQ(ShowWarning(nullptr, "Message", "ShowSomething"), 0);
-}
-
-TEST_F(DialogTest, TheStoreIsInstalledForItsLifetimeAndSavedToItsFile) {
-    wxConfigBase* before = wxConfigBase::Get(false);
-    {
-        DialogSettingsStore store;
-        EXPECT_EQ(wxConfigBase::Get(false), store.Get());
-        store.Get()->Write("ShowErrorCreateLayer", false);
-    }
-    EXPECT_EQ(wxConfigBase::Get(false), before);
-    const auto file = DialogSettingsStore::FilePath();
-    ASSERT_TRUE(std::filesystem::exists(file)) << file;
-    EXPECT_EQ(file.parent_path().filename(), "Corvid");
-    DialogSettingsStore again;
-    EXPECT_FALSE(again.Get()->ReadBool("ShowErrorCreateLayer", true));
 }
 
 TEST_F(DialogTest, ChoicesUnderTheFormerStoreNameCarryOverOnce) {
