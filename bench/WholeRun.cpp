@@ -5,6 +5,7 @@
 // the clock starts. Prints the median over the runs, per-stage totals from the module's stage timer
 // (NOCTIVA_STAGE_TIMES), the tile count and the process's peak resident memory.
 #include <sys/resource.h>
+#include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -30,6 +31,7 @@ struct Options {
     std::vector<int> depths{8, 16};
     std::vector<std::string> threads{"1", "2"};
     bool reference = true;  // also time NOCTIVA_REFERENCE=1 (one thread) and print the ratios
+    bool pair = false;      // also two one-thread runs in two processes at once
     std::string par1;
     std::string module = NOCTIVA_MODULE_PATH;
 };
@@ -106,9 +108,11 @@ std::map<std::string, double> readStages(const std::string& path) {
 void usage() {
     std::puts(
         "noctiva_bench_run [--width W] [--height H] [--runs N] [--depth 8|16|both] [--threads LIST]\n"
-        "                  [--par1 TEXT] [--module PATH] [--no-reference]\n"
+        "                  [--par1 TEXT] [--module PATH] [--no-reference] [--pair]\n"
         "  --threads: comma-separated NOCTIVA_THREADS values (default 1,2)\n"
-        "  the reference path (NOCTIVA_REFERENCE=1, one thread) is timed too unless --no-reference");
+        "  the reference path (NOCTIVA_REFERENCE=1, one thread) is timed too unless --no-reference\n"
+        "  --pair: two processes run one thread each at the same time: what two independent cores\n"
+        "          of this machine deliver together, the ceiling for two threads");
 }
 
 bool parse(int argc, char** argv, Options& o) {
@@ -124,6 +128,7 @@ bool parse(int argc, char** argv, Options& o) {
         else if (a == "--par1") o.par1 = value();
         else if (a == "--module") o.module = value();
         else if (a == "--no-reference") o.reference = false;
+        else if (a == "--pair") o.pair = true;
         else if (a == "--depth") {
             const std::string d = value();
             o.depths = d == "both" ? std::vector<int>{8, 16} : std::vector<int>{std::stoi(d)};
@@ -137,6 +142,64 @@ bool parse(int argc, char** argv, Options& o) {
         }
     }
     return true;
+}
+
+// Median filter time of `runs` one-thread runs, the image generated before the clock starts.
+double timeOneThread(const Options& o, const Module& module, int depth) {
+    Image image(o.width, o.height, 3, depth);
+    std::vector<double> times;
+    for (int run = 0; run < o.runs; ++run) {
+        generate(image, 12345u);
+        RunOptions ro;
+        if (!o.par1.empty()) ro.par1 = o.par1;
+        Session session(image, ro);
+        const auto t0 = std::chrono::steady_clock::now();
+        if (!session.run(module.entry()).ok()) return -1.0;
+        times.push_back(std::chrono::duration<double, std::milli>(std::chrono::steady_clock::now() - t0).count());
+    }
+    return median(times);
+}
+
+// Two processes, one thread each, started together: no sharing and no synchronisation between
+// them, so their combined rate bounds what two threads of one run can reach here.
+void pairProbe(const Options& o, const Module& module, int depth) {
+    setenv("NOCTIVA_THREADS", "1", 1);
+    unsetenv("NOCTIVA_REFERENCE");
+    unsetenv("NOCTIVA_STAGE_TIMES");
+    int go[2], results[2];
+    if (pipe(go) != 0 || pipe(results) != 0) return;
+    pid_t children[2];
+    for (pid_t& child : children) {
+        child = fork();
+        if (child == 0) {
+            char start;
+            close(go[1]);
+            if (read(go[0], &start, 1) != 1) _exit(1);
+            const double ms = timeOneThread(o, module, depth);
+            if (write(results[1], &ms, sizeof ms) != sizeof ms) _exit(1);
+            _exit(0);
+        }
+    }
+    close(go[0]);
+    const char start[2] = {1, 1};
+    if (write(go[1], start, 2) != 2) return;
+    close(go[1]);
+    double ms[2] = {0, 0};
+    for (double& m : ms)
+        if (read(results[0], &m, sizeof m) != sizeof m) m = -1.0;
+    for (pid_t child : children) waitpid(child, nullptr, 0);
+    close(results[0]);
+    close(results[1]);
+    const double mpix = double(o.width) * o.height / 1e6;
+    const double solo = timeOneThread(o, module, depth);
+    if (ms[0] <= 0 || ms[1] <= 0 || solo <= 0) {
+        std::printf("pair probe failed\n");
+        return;
+    }
+    const double together = mpix / (ms[0] / 1000.0) + mpix / (ms[1] / 1000.0);
+    std::printf("%2d-bit pair probe: one process alone %.1f ms (%.1f Mpix/s); two at once %.1f and %.1f ms, "
+                "%.1f Mpix/s together, %.2fx one alone\n",
+                depth, solo, mpix / (solo / 1000.0), ms[0], ms[1], together, together / (mpix / (solo / 1000.0)));
 }
 
 }  // namespace
@@ -211,5 +274,8 @@ int main(int argc, char** argv) {
     const double peakMiB = double(peakRssKiB()) / 1024.0;
     std::printf("peak resident %.1f MiB; host's two image buffers %.1f MiB; budget %.1f MiB -> %s\n", peakMiB,
                 imageMiB, imageMiB + 64.0, peakMiB <= imageMiB + 64.0 ? "within" : "OVER");
+    // After the memory figure: the probe's own image would count in it.
+    if (o.pair)
+        for (int depth : o.depths) pairProbe(o, module, depth);
     return 0;
 }
