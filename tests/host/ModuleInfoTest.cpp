@@ -2,7 +2,6 @@
 // the module does not accept, and the parent window handed to the module.
 #include <elf.h>
 #include <gtest/gtest.h>
-#include <stdlib.h>
 
 #include <cstring>
 #include <fstream>
@@ -14,6 +13,7 @@
 #include "noctiva/host/ModuleInfo.h"
 #include "noctiva/host/ParentWindow.h"
 #include "noctiva/host/Session.h"
+#include "lib/TestFiles.h"
 #include "ui/Processes.h"
 
 namespace fs = std::filesystem;
@@ -138,27 +138,13 @@ Bytes elf(const std::vector<std::pair<std::string, Bytes>>& sections) {
     return file;
 }
 
-class TempDir {
-public:
-    TempDir() {
-        std::string pattern = (fs::temp_directory_path() / "noctiva-modinfo-XXXXXX").string();
-        if (!mkdtemp(pattern.data())) throw std::runtime_error("mkdtemp failed");
-        path_ = pattern;
-    }
-    ~TempDir() {
-        std::error_code ec;
-        fs::remove_all(path_, ec);
-    }
-    fs::path write(const std::string& name, const Bytes& data) const {
-        const fs::path p = path_ / name;
-        std::ofstream(p, std::ios::binary).write(reinterpret_cast<const char*>(data.data()), std::streamsize(data.size()));
-        return p;
-    }
-    const fs::path& path() const { return path_; }
+using vek::testing::TempDir;
 
-private:
-    fs::path path_;
-};
+fs::path writeBytes(const TempDir& dir, const std::string& name, const Bytes& data) {
+    const fs::path p = dir / name;
+    std::ofstream(p, std::ios::binary).write(reinterpret_cast<const char*>(data.data()), std::streamsize(data.size()));
+    return p;
+}
 
 // The reason of the HostError `f` throws; fails the test if it throws nothing or something else.
 template <typename F>
@@ -180,23 +166,6 @@ ModuleInfo parse(const Bytes& p, const std::optional<Bytes>& a = std::nullopt) {
     if (a) aeteSpan = std::span<const std::uint8_t>(*a);
     return parseModuleResources("test", p, aeteSpan);
 }
-
-// Sets or removes DISPLAY for one scope.
-class DisplayVariable {
-public:
-    explicit DisplayVariable(const std::string& value) {
-        if (const char* v = getenv("DISPLAY")) saved_ = v;
-        if (value.empty()) unsetenv("DISPLAY");
-        else setenv("DISPLAY", value.c_str(), 1);
-    }
-    ~DisplayVariable() {
-        if (saved_) setenv("DISPLAY", saved_->c_str(), 1);
-        else unsetenv("DISPLAY");
-    }
-
-private:
-    std::optional<std::string> saved_;
-};
 
 }  // namespace
 
@@ -266,7 +235,7 @@ TEST(ModuleInfo, PiplAddedToFakeModuleDecidesEntryAndModes) {
     if (!runShell("objcopy --version > /dev/null 2>&1")) GTEST_SKIP() << "objcopy is missing";
     TempDir dir;
     auto withPipl = [&](const std::string& name, const Bytes& resource) {
-        const fs::path section = dir.write(name + ".pipl", resource);
+        const fs::path section = writeBytes(dir, name + ".pipl", resource);
         const fs::path module = dir.path() / (name + ".so");
         const std::string cmd = "objcopy --add-section PIPL=" + section.string() +
                                 " --set-section-flags PIPL=alloc " + std::string(FAKE_MODULE_PATH) + " " +
@@ -458,18 +427,18 @@ TEST(ModuleInfo, TruncatedResourcesAndFilesAreRefusedAtEveryLength) {
 
     TempDir dir;
     for (std::size_t n = 0; n < p.size(); n += 1) {
-        const fs::path f = dir.write("pipl" + std::to_string(n), elf({{"PIPL", Bytes(p.begin(), p.begin() + std::ptrdiff_t(n))}}));
+        const fs::path f = writeBytes(dir, "pipl" + std::to_string(n), elf({{"PIPL", Bytes(p.begin(), p.begin() + std::ptrdiff_t(n))}}));
         EXPECT_FALSE(errorOf([&] { readModuleInfo(f); }).empty()) << n;
         fs::remove(f);
     }
     const Bytes file = elf({{".text", Bytes(40, 0x90)}, {"PIPL", p}, {"AETE", a}});
-    const fs::path whole = dir.write("whole.so", file);
+    const fs::path whole = writeBytes(dir, "whole.so", file);
     const ModuleInfo info = readModuleInfo(whole);
     EXPECT_EQ(info.name, "Test...");
     ASSERT_TRUE(info.event);
     EXPECT_EQ(info.event->name, "Test");
     for (std::size_t n = 0; n < file.size(); ++n) {
-        const fs::path f = dir.write("cut" + std::to_string(n), Bytes(file.begin(), file.begin() + std::ptrdiff_t(n)));
+        const fs::path f = writeBytes(dir, "cut" + std::to_string(n), Bytes(file.begin(), file.begin() + std::ptrdiff_t(n)));
         EXPECT_FALSE(errorOf([&] { readModuleInfo(f); }).empty()) << n;
         fs::remove(f);
     }
@@ -526,7 +495,7 @@ TEST(ModuleInfo, MalformedElfFilesGiveClearReasons) {
     TempDir dir;
     int i = 0;
     for (const Case& c : cases) {
-        const fs::path f = dir.write("case" + std::to_string(i++), c.file);
+        const fs::path f = writeBytes(dir, "case" + std::to_string(i++), c.file);
         const std::string reason = errorOf([&] { readModuleInfo(f); });
         EXPECT_EQ(reason.rfind(c.reason, 0), 0u) << "case " << i - 1 << " got: " << reason << "\nwanted: " << c.reason;
     }
@@ -551,7 +520,7 @@ void windowEntry(pi::int16 selector, pi::FilterRecord* record, intptr_t*, pi::in
 }  // namespace
 
 TEST(ParentWindow, NoDisplayGivesZero) {
-    DisplayVariable none("");
+    vek::testing::ScopedEnv none("DISPLAY", nullptr);
     EXPECT_FALSE(ParentWindow::open());
     Image image(2, 2, 3, 8);
     gSeenWindow = -1;
@@ -560,7 +529,7 @@ TEST(ParentWindow, NoDisplayGivesZero) {
     EXPECT_EQ(gSeenWindow, 0);
     EXPECT_EQ(r.parentWindow, 0);
 
-    DisplayVariable unreachable(":9999");  // nothing listens there
+    vek::testing::ScopedEnv unreachable("DISPLAY", ":9999");  // nothing listens there
     EXPECT_FALSE(ParentWindow::open());
 }
 
@@ -568,7 +537,7 @@ TEST(ParentWindow, DisplayGivesAWindowForTheRunOnly) {
     if (!runShell("command -v Xvfb >/dev/null && command -v xwininfo >/dev/null")) GTEST_SKIP() << "Xvfb or xwininfo missing";
     XvfbServer server;
     if (server.display().empty()) GTEST_SKIP() << "Xvfb could not be started";
-    DisplayVariable display(server.display());
+    vek::testing::ScopedEnv display("DISPLAY", server.display().c_str());
     gDisplay = server.display();
     gSeenWindow = -1;
     gWindowInfo.reset();
