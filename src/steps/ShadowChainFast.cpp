@@ -38,6 +38,7 @@ constexpr int32_t kLabBorder = 30;
 // threads take half as many, so that a tile has a dozen chunks to share evenly; each chunk costs
 // its own start-up sums.
 constexpr int32_t kChunkValues = 96;
+constexpr int32_t kPrefetchRows = 4;
 constexpr int32_t kSharedChunkValues = 48;
 
 inline int32_t clampIndex(int64_t v, int32_t size) { return int32_t(v < 0 ? 0 : (v >= size ? size - 1 : v)); }
@@ -449,6 +450,12 @@ void runTile(const cPixelBlock& source, cPixelBlock& destination, KERNEL::cWorke
         };
         for (int32_t y = r0 + b; y < r0 + e; ++y) {
             const S* in = reinterpret_cast<const S*>(source.data + size_t(y) * source.rowBytes);
+            // The host's rows may lie far apart in its image: ask for a later row's span early.
+            if (y + kPrefetchRows < r1) {
+                const uint8_t* ahead = source.data + size_t(y + kPrefetchRows) * source.rowBytes + size_t(s0) * source.bytesPerPixel;
+                const size_t span = size_t(s1 - s0) * source.bytesPerPixel;
+                for (size_t off = 0; off < span; off += 64) __builtin_prefetch(ahead + off);
+            }
             auto convert = [&](int32_t x0, int32_t x1, bool lab) {
                 if (x0 >= x1) return;
                 const S* at = in + size_t(x0) * size_t(ch);
