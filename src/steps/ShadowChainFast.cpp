@@ -220,19 +220,24 @@ struct cKernels {
 };
 
 #if defined(__x86_64__) && (defined(__GNUC__) || defined(__clang__))
-// The mix for 8-bit RGB, eight pixels at a time: the compiler cannot interleave the three byte
-// planes into pixels without a long chain of shuffles. Same arithmetic as mixSpan: L / 3 by the
-// multiply-high of 0xAAAAAAAB (exact for every 32-bit L), the rest as written there.
+// The mix for RGB, eight pixels at a time: the compiler cannot interleave the three planes into
+// pixels without a long chain of shuffles. Same arithmetic as mixSpan: L / 3 by the multiply-high
+// of 0xAAAAAAAB (exact for every 32-bit L), the rest as written there.
 __attribute__((target("avx2"))) inline __m256i load8(const uint16_t* p) {
     return _mm256_cvtepu16_epi32(_mm_loadu_si128(reinterpret_cast<const __m128i*>(p)));
 }
-// Clamped to 0..65535, then the 8-bit sample.
-__attribute__((target("avx2"))) inline __m256i clampShift(__m256i v) {
-    return _mm256_srli_epi32(_mm256_min_epi32(_mm256_max_epi32(v, _mm256_setzero_si256()), _mm256_set1_epi32(65535)), 8);
+__attribute__((target("avx2"))) inline __m256i clamp16x8(__m256i v) {
+    return _mm256_min_epi32(_mm256_max_epi32(v, _mm256_setzero_si256()), _mm256_set1_epi32(65535));
 }
-// Eight pixels from `i`, packed to 24 bytes: the low lane's first 12 bytes, then the high lane's.
-__attribute__((target("avx2"))) inline __m256i mixBlock(const uint16_t* input, const uint16_t* bL, const uint16_t* bA,
-                                                        const uint16_t* bB, int32_t i) {
+// The block's pixels leave as 12-byte pieces: 2 for 8-bit samples, 4 for 16-bit.
+template <class S>
+constexpr int kPieces = sizeof(S) == 1 ? 2 : 4;
+constexpr int kPieceBytes = 12;
+
+// Eight pixels from `i`, in the host's depth, as kPieces<S> pieces (each in a vector's first 12 bytes).
+template <class S>
+__attribute__((target("avx2"))) inline void mixBlock(const uint16_t* input, const uint16_t* bL, const uint16_t* bA,
+                                                     const uint16_t* bB, int32_t i, __m128i* piece) {
     const __m256i magic = _mm256_set1_epi32(int32_t(0xAAAAAAABu));
     const __m256i x = _mm256_add_epi32(load8(bL + i), _mm256_slli_epi32(load8(input + i), 1));
     const __m256i even = _mm256_srli_epi64(_mm256_mul_epu32(x, magic), 33);
@@ -242,41 +247,65 @@ __attribute__((target("avx2"))) inline __m256i mixBlock(const uint16_t* input, c
     const __m256i p = _mm256_srai_epi32(_mm256_mullo_epi32(A, _mm256_set1_epi32(1365)), 10);
     const __m256i q = _mm256_srai_epi32(_mm256_mullo_epi32(A, _mm256_set1_epi32(682)), 10);
     const __m256i Lm = _mm256_sub_epi32(L, _mm256_set1_epi32(10922));
-    const __m256i r = clampShift(_mm256_sub_epi32(_mm256_add_epi32(Lm, p), B));
-    const __m256i g = clampShift(_mm256_sub_epi32(_mm256_add_epi32(Lm, B), q));
-    const __m256i b = clampShift(_mm256_sub_epi32(_mm256_sub_epi32(_mm256_add_epi32(L, _mm256_set1_epi32(54612)), q), B));
-    const __m256i px = _mm256_or_si256(r, _mm256_or_si256(_mm256_slli_epi32(g, 8), _mm256_slli_epi32(b, 16)));
-    // Per 128-bit lane: bytes 0..2 of each 32-bit pixel, packed to the lane's first 12 bytes.
-    const __m256i pack = _mm256_setr_epi8(0, 1, 2, 4, 5, 6, 8, 9, 10, 12, 13, 14, -1, -1, -1, -1,  //
-                                          0, 1, 2, 4, 5, 6, 8, 9, 10, 12, 13, 14, -1, -1, -1, -1);
-    return _mm256_shuffle_epi8(px, pack);
+    __m256i r = clamp16x8(_mm256_sub_epi32(_mm256_add_epi32(Lm, p), B));
+    __m256i g = clamp16x8(_mm256_sub_epi32(_mm256_add_epi32(Lm, B), q));
+    __m256i b = clamp16x8(_mm256_sub_epi32(_mm256_sub_epi32(_mm256_add_epi32(L, _mm256_set1_epi32(54612)), q), B));
+    if constexpr (sizeof(S) == 1) {
+        r = _mm256_srli_epi32(r, 8);
+        g = _mm256_srli_epi32(g, 8);
+        b = _mm256_srli_epi32(b, 8);
+        const __m256i px = _mm256_or_si256(r, _mm256_or_si256(_mm256_slli_epi32(g, 8), _mm256_slli_epi32(b, 16)));
+        // Per 128-bit lane: bytes 0..2 of each 32-bit pixel.
+        const __m256i pack = _mm256_setr_epi8(0, 1, 2, 4, 5, 6, 8, 9, 10, 12, 13, 14, -1, -1, -1, -1,  //
+                                              0, 1, 2, 4, 5, 6, 8, 9, 10, 12, 13, 14, -1, -1, -1, -1);
+        const __m256i packed = _mm256_shuffle_epi8(px, pack);
+        piece[0] = _mm256_castsi256_si128(packed);
+        piece[1] = _mm256_extracti128_si256(packed, 1);
+    } else {
+        r = _mm256_srli_epi32(r, 1);
+        g = _mm256_srli_epi32(g, 1);
+        b = _mm256_srli_epi32(b, 1);
+        // Per lane: (r g) (b 0) pairs of two pixels, then the zero sample dropped.
+        const __m256i rg = _mm256_or_si256(r, _mm256_slli_epi32(g, 16));
+        const __m256i pack = _mm256_setr_epi8(0, 1, 2, 3, 4, 5, 8, 9, 10, 11, 12, 13, -1, -1, -1, -1,  //
+                                              0, 1, 2, 3, 4, 5, 8, 9, 10, 11, 12, 13, -1, -1, -1, -1);
+        const __m256i lo = _mm256_shuffle_epi8(_mm256_unpacklo_epi32(rg, b), pack);  // pixels 0 1 | 4 5
+        const __m256i hi = _mm256_shuffle_epi8(_mm256_unpackhi_epi32(rg, b), pack);  // pixels 2 3 | 6 7
+        piece[0] = _mm256_castsi256_si128(lo);
+        piece[1] = _mm256_castsi256_si128(hi);
+        piece[2] = _mm256_extracti128_si256(lo, 1);
+        piece[3] = _mm256_extracti128_si256(hi, 1);
+    }
 }
 
-__attribute__((target("avx2"))) void mixRgb8Avx2(const uint16_t* __restrict input, const uint16_t* __restrict blur,
-                                                 size_t plane, int32_t n, uint8_t* __restrict out) {
+template <class S>
+__attribute__((target("avx2"))) void mixRgbAvx2(const uint16_t* __restrict input, const uint16_t* __restrict blur,
+                                                size_t plane, int32_t n, S* __restrict out) {
+    if (n < 8) {
+        mixSpan<S, 3>(input, blur, plane, 3, n, out);
+        return;
+    }
     const uint16_t* bL = blur;
     const uint16_t* bA = blur + plane;
     const uint16_t* bB = blur + 2 * plane;
-    if (n < 8) {
-        mixSpan<uint8_t, 3>(input, blur, plane, 3, n, out);
-        return;
-    }
+    constexpr size_t kPixel = 3 * sizeof(S);
+    uint8_t* const o = reinterpret_cast<uint8_t*>(out);
+    __m128i piece[kPieces<S>];
     int32_t i = 0;
-    // Each block stores 16 bytes at its 12th: all but the last block have 4 bytes of room after.
+    // Each piece is stored as 16 bytes: all but the last block have room for the 4 extra.
     for (; i + 10 <= n; i += 8) {
-        const __m256i packed = mixBlock(input, bL, bA, bB, i);
-        uint8_t* o = out + 3 * size_t(i);
-        _mm_storeu_si128(reinterpret_cast<__m128i*>(o), _mm256_castsi256_si128(packed));
-        _mm_storeu_si128(reinterpret_cast<__m128i*>(o + 12), _mm256_extracti128_si256(packed, 1));
+        mixBlock<S>(input, bL, bA, bB, i, piece);
+        for (int k = 0; k < kPieces<S>; ++k)
+            _mm_storeu_si128(reinterpret_cast<__m128i*>(o + kPixel * size_t(i) + size_t(kPieceBytes * k)), piece[k]);
     }
     if (i < n) {
         // The last pixels: the block ending at n, through a buffer.
         const int32_t from = n - 8;
-        const __m256i packed = mixBlock(input, bL, bA, bB, from);
-        alignas(32) uint8_t bytes[32];
-        _mm_store_si128(reinterpret_cast<__m128i*>(bytes), _mm256_castsi256_si128(packed));
-        _mm_storeu_si128(reinterpret_cast<__m128i*>(bytes + 12), _mm256_extracti128_si256(packed, 1));
-        std::memcpy(out + 3 * size_t(i), bytes + 3 * (i - from), 3 * size_t(n - i));
+        mixBlock<S>(input, bL, bA, bB, from, piece);
+        alignas(16) uint8_t bytes[kPieceBytes * kPieces<S> + 4];
+        for (int k = 0; k < kPieces<S>; ++k)
+            _mm_storeu_si128(reinterpret_cast<__m128i*>(bytes + kPieceBytes * k), piece[k]);
+        std::memcpy(o + kPixel * size_t(i), bytes + kPixel * size_t(i - from), kPixel * size_t(n - i));
     }
 }
 
@@ -285,9 +314,18 @@ void cKernels<uint8_t, 3>::mix(const uint16_t* in, const uint16_t* blur, size_t 
                                uint8_t* out) {
     static const bool avx2 = __builtin_cpu_supports("avx2");
     if (avx2)
-        mixRgb8Avx2(in, blur, plane, n, out);
+        mixRgbAvx2<uint8_t>(in, blur, plane, n, out);
     else
         mixSpan<uint8_t, 3>(in, blur, plane, 3, n, out);
+}
+template <>
+void cKernels<uint16_t, 3>::mix(const uint16_t* in, const uint16_t* blur, size_t plane, int32_t, int32_t n,
+                                uint16_t* out) {
+    static const bool avx2 = __builtin_cpu_supports("avx2");
+    if (avx2)
+        mixRgbAvx2<uint16_t>(in, blur, plane, n, out);
+    else
+        mixSpan<uint16_t, 3>(in, blur, plane, 3, n, out);
 }
 #endif
 
