@@ -17,6 +17,7 @@
 #include "steps/Step3.h"
 #include "steps/Step4.h"
 #include "support/MallocHost.h"
+#include "support/StepFields.h"
 
 using graphtest::Image;
 using KERNEL::cRect;
@@ -50,30 +51,21 @@ struct Shadow {
     int32_t* field(int i) { return fields()[size_t(i)]; }
     std::vector<int32_t*> fields() {
         std::vector<int32_t*> f;
-        auto& s4 = *step4;
-        auto& s3 = *step3;
-        auto& s2 = *step2;
-        auto& s1 = *step1;
-        for (int32_t* p : {&s4.blackLevel1, &s4.whiteLevel1, &s4.curveStrength2, &s4.blackLevel2, &s4.whiteLevel2,
-                           &s4.gradientLevel3, &s4.curveStrength3, &s4.blackPoint5, &s4.whitePoint5, &s4.toneRed5,
-                           &s4.toneBlue5, &s4.toneSelector4, &s4.liftAmount4, &s4.darkenAmount4, &s4.mode,
-                           &s3.gradeMix, &s3.saturationPercent, &s3.warmthPercent, &s3.shiftStrength3,
-                           &s3.shiftBase3, &s3.shiftLevelR3, &s3.shiftLevelG3, &s3.shiftLevelB3,
-                           &s3.shiftStrength4, &s3.shiftBase4, &s3.shiftLevelR4, &s3.shiftLevelG4,
-                           &s3.shiftLevelB4, &s3.toneSelector, &s3.toneAmount0, &s3.toneAmount1, &s3.toneAmount2,
-                           &s3.toneAmount3, &s3.mode, &s2.impulseLevel, &s2.impulseFlatness, &s2.lumaMedianRadius,
-                           &s2.lumaMedianKeep, &s2.rankPreset3, &s2.smoothThreshold4, &s2.smoothStrength4,
-                           &s2.edgeLimit5, &s2.lumaKeepPercent5, &s2.rankPreset6, &s2.colourTolerance7,
-                           &s2.waveletStrength7, &s2.referenceRed7, &s2.referenceGreen7, &s2.referenceBlue7,
-                           &s2.preset9, &s2.mode, &s1.medianRadius1, &s1.medianRadius2, &s1.chromaLimitPercent,
-                           &s1.edgeStrength, &s1.medianRadius4, &s1.preset3, &s1.mode})
-            f.push_back(p);
+        const auto add = [&f](std::vector<int32_t*> stepFields, int32_t* mode) {
+            f.insert(f.end(), stepFields.begin(), stepFields.end());
+            f.push_back(mode);
+        };
+        add(testsupport::fieldsOf(*step4), &step4->mode);
+        add(testsupport::fieldsOf(*step3), &step3->mode);
+        add(testsupport::fieldsOf(*step2), &step2->mode);
+        add(testsupport::fieldsOf(*step1), &step1->mode);
         return f;
     }
 };
 
 TEST(ShadowChain, ReadingBackReproducesEveryField) {
     Shadow a;
+    ASSERT_EQ(a.fields().size(), kShadowParameterCount);
     int32_t v = -29;
     for (int32_t* f : a.fields()) {
         v += 1237;

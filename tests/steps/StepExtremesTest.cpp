@@ -14,27 +14,14 @@
 #include "steps/Step3.h"
 #include "steps/Step4.h"
 #include "steps/StepTestSupport.h"
+#include "support/StepFields.h"
 
 using namespace steptest;
 using KERNEL::cRect;
 
 namespace {
 
-std::vector<int32_t*> fieldsOf(cStep1& s) {
-    return {&s.medianRadius1, &s.medianRadius2, &s.chromaLimitPercent, &s.edgeStrength, &s.medianRadius4,
-            &s.preset3};
-}
-std::vector<int32_t*> fieldsOf(cStep3& s) {
-    return {&s.gradeMix,       &s.saturationPercent, &s.warmthPercent, &s.shiftStrength3, &s.shiftBase3,
-            &s.shiftLevelR3,   &s.shiftLevelG3,      &s.shiftLevelB3,  &s.shiftStrength4, &s.shiftBase4,
-            &s.shiftLevelR4,   &s.shiftLevelG4,      &s.shiftLevelB4,  &s.toneSelector,   &s.toneAmount0,
-            &s.toneAmount1,    &s.toneAmount2,       &s.toneAmount3};
-}
-std::vector<int32_t*> fieldsOf(cStep4& s) {
-    return {&s.blackLevel1, &s.whiteLevel1, &s.curveStrength2, &s.blackLevel2, &s.whiteLevel2,
-            &s.gradientLevel3, &s.curveStrength3, &s.blackPoint5, &s.whitePoint5, &s.toneRed5,
-            &s.toneBlue5, &s.toneSelector4, &s.liftAmount4, &s.darkenAmount4};
-}
+using testsupport::fieldsOf;
 
 // A picture with ordinary samples and, in its first row, the ends of the int range.
 Image extremePicture(uint32_t seed) {
