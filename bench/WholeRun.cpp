@@ -219,54 +219,65 @@ int main(int argc, char** argv) {
     std::printf("image %d x %d (%.1f MP), %d runs per configuration, settings: %s\n", o.width, o.height, mpix,
                 o.runs, o.par1.empty() ? "default" : o.par1.c_str());
 
-    Image image(o.width, o.height, 3, 8);
+    // Runs go round the configurations (run 1 of each, then run 2 of each ...), so a slow spell of a
+    // shared machine falls on all of them alike.
+    struct Measurement {
+        int depth;
+        std::string configuration;
+        std::vector<double> times;
+        std::map<std::string, std::vector<double>> stages;
+        long tiles = 0;
+    };
+    std::vector<Measurement> measurements;
     for (int depth : o.depths) {
-        image.depth = depth;
-        std::vector<std::string> configurations = o.threads;
-        if (o.reference) configurations.insert(configurations.begin(), "reference");
-        double referenceMs = 0.0;
-        for (const std::string& configuration : configurations) {
-            const bool isReference = configuration == "reference";
-            const std::string t = isReference ? "1" : configuration;
-            setenv("NOCTIVA_THREADS", t.c_str(), 1);
+        if (o.reference) measurements.push_back({depth, "reference", {}, {}, 0});
+        for (const std::string& t : o.threads) measurements.push_back({depth, t, {}, {}, 0});
+    }
+    Image image(o.width, o.height, 3, 8);
+    for (int run = 0; run < o.runs; ++run) {
+        for (Measurement& m : measurements) {
+            const bool isReference = m.configuration == "reference";
+            setenv("NOCTIVA_THREADS", isReference ? "1" : m.configuration.c_str(), 1);
             if (isReference)
                 setenv("NOCTIVA_REFERENCE", "1", 1);
             else
                 unsetenv("NOCTIVA_REFERENCE");
-            std::vector<double> times;
-            std::map<std::string, std::vector<double>> stages;
-            long tiles = 0;
-            for (int run = 0; run < o.runs; ++run) {
-                generate(image, 12345u);
-                std::remove(stageFile.c_str());
-                RunOptions ro;
-                if (!o.par1.empty()) ro.par1 = o.par1;
-                Session session(image, ro);
-                const auto t0 = std::chrono::steady_clock::now();
-                const RunResult r = session.run(module.entry());
-                const auto t1 = std::chrono::steady_clock::now();
-                if (!r.ok()) {
-                    std::fprintf(stderr, "run failed: %s\n", r.message().c_str());
-                    return 1;
-                }
-                times.push_back(std::chrono::duration<double, std::milli>(t1 - t0).count());
-                tiles = r.tilesServed;
-                for (const auto& [name, v] : readStages(stageFile)) stages[name].push_back(v);
+            image.depth = m.depth;
+            generate(image, 12345u);
+            std::remove(stageFile.c_str());
+            RunOptions ro;
+            if (!o.par1.empty()) ro.par1 = o.par1;
+            Session session(image, ro);
+            const auto t0 = std::chrono::steady_clock::now();
+            const RunResult r = session.run(module.entry());
+            const auto t1 = std::chrono::steady_clock::now();
+            if (!r.ok()) {
+                std::fprintf(stderr, "run failed: %s\n", r.message().c_str());
+                return 1;
             }
-            const double ms = median(times);
-            if (isReference) referenceMs = ms;
-            std::printf("%2d-bit %-10s  filter %8.1f ms  %7.1f Mpix/s  (min %.1f ms)  tiles %ld", depth,
-                        isReference ? "reference" : ("threads " + t).c_str(), ms, mpix / (ms / 1000.0),
-                        *std::min_element(times.begin(), times.end()), tiles);
-            if (!isReference && referenceMs > 0.0) std::printf("  %.2fx the reference", referenceMs / ms);
+            m.times.push_back(std::chrono::duration<double, std::milli>(t1 - t0).count());
+            m.tiles = r.tilesServed;
+            for (const auto& [name, v] : readStages(stageFile)) m.stages[name].push_back(v);
+        }
+    }
+    double referenceMs = 0.0;
+    for (Measurement& m : measurements) {
+        const bool isReference = m.configuration == "reference";
+        const double ms = median(m.times);
+        if (isReference) referenceMs = ms;
+        std::printf("%2d-bit %-10s  filter %8.1f ms  %7.1f Mpix/s  (min %.1f ms)  tiles %ld", m.depth,
+                    isReference ? "reference" : ("threads " + m.configuration).c_str(), ms, mpix / (ms / 1000.0),
+                    *std::min_element(m.times.begin(), m.times.end()), m.tiles);
+        if (!isReference && referenceMs > 0.0) std::printf("  %.2fx the reference", referenceMs / ms);
+        std::printf("\n");
+        if (!m.stages.empty()) {
+            std::printf("    stages (median ms):");
+            for (const char* name : {"convertIn", "lab", "step2", "labBack", "convertOut", "rows", "columns", "mix",
+                                     "poolWake", "poolEnd", "apply"})
+                if (m.stages.count(name) && median(m.stages[name]) > 0.0)
+                    std::printf(" %s %.1f", name, median(m.stages[name]));
+            if (m.stages.count("apply")) std::printf("  host+rest %.1f", ms - median(m.stages["apply"]));
             std::printf("\n");
-            if (!stages.empty()) {
-                std::printf("    stages (median ms):");
-                for (const char* name : {"convertIn", "lab", "step2", "labBack", "convertOut", "rows", "columns", "mix", "poolWake", "poolEnd", "apply"})
-                    if (stages.count(name)) std::printf(" %s %.1f", name, median(stages[name]));
-                if (stages.count("apply")) std::printf("  host+rest %.1f", ms - median(stages["apply"]));
-                std::printf("\n");
-            }
         }
     }
     std::remove(stageFile.c_str());
