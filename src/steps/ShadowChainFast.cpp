@@ -298,14 +298,16 @@ __attribute__((target("avx2"))) void mixRgbAvx2(const uint16_t* __restrict input
         for (int k = 0; k < kPieces<S>; ++k)
             _mm_storeu_si128(reinterpret_cast<__m128i*>(o + kPixel * size_t(i) + size_t(kPieceBytes * k)), piece[k]);
     }
-    if (i < n) {
-        // The last pixels: the block ending at n, through a buffer.
-        const int32_t from = n - 8;
+    // The last 0 to 9 pixels: whole blocks through a buffer, the last one ending at n.
+    while (i < n) {
+        const int32_t from = std::min(i, n - 8);
         mixBlock<S>(input, bL, bA, bB, from, piece);
         alignas(16) uint8_t bytes[kPieceBytes * kPieces<S> + 4];
         for (int k = 0; k < kPieces<S>; ++k)
             _mm_storeu_si128(reinterpret_cast<__m128i*>(bytes + kPieceBytes * k), piece[k]);
-        std::memcpy(o + kPixel * size_t(i), bytes + kPixel * size_t(i - from), kPixel * size_t(n - i));
+        const int32_t end = from + 8;
+        std::memcpy(o + kPixel * size_t(i), bytes + kPixel * size_t(i - from), kPixel * size_t(end - i));
+        i = end;
     }
 }
 

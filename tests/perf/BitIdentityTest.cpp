@@ -122,7 +122,8 @@ INSTANTIATE_TEST_SUITE_P(
                       // Column chunks with a remainder, lines shorter than the blur, one row, rows
                       // around the vector mix's block of eight pixels.
                       Shape{216, 31, 3, 8, {}}, Shape{13, 613, 3, 8, {}}, Shape{701, 3, 4, 16, {}},
-                      Shape{401, 1, 3, 8, {}}, Shape{8, 9, 3, 8, {}}, Shape{10, 5, 3, 8, {}}, Shape{333, 517, 4, 16, Selection{5, 9, 317, 499}},
+                      Shape{401, 1, 3, 8, {}}, Shape{8, 9, 3, 8, {}}, Shape{10, 5, 3, 8, {}},
+                      Shape{11, 6, 3, 8, {}}, Shape{11, 6, 3, 16, {}}, Shape{333, 517, 4, 16, Selection{5, 9, 317, 499}},
                       Shape{471, 452, 4, 8, Selection{199, 201, 251, 249}}),
     [](const ::testing::TestParamInfo<Shape>& info) { return name(info.param); });
 
