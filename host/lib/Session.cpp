@@ -1,9 +1,14 @@
 #include "noctiva/host/Session.h"
 
 #include <algorithm>
+#include <cstdint>
 #include <cstring>
 #include <stdexcept>
 #include <utility>
+
+#if defined(__SSE2__)
+#include <emmintrin.h>
+#endif
 
 #include "SessionImpl.h"
 #include "noctiva/host/Module.h"
@@ -83,6 +88,27 @@ std::string RunResult::message() const {
     }
     return hostError;
 }
+
+namespace {
+
+// 8-bit samples into the image's 16-bit storage. The image is far larger than the caches, so the
+// stores bypass them (no read of the lines they overwrite).
+void widen(const std::uint8_t* src, std::uint16_t* dst, std::size_t n) {
+    std::size_t i = 0;
+#if defined(__SSE2__)
+    for (; i < n && (reinterpret_cast<std::uintptr_t>(dst + i) & 15) != 0; ++i) dst[i] = src[i];
+    const __m128i zero = _mm_setzero_si128();
+    for (; i + 16 <= n; i += 16) {
+        const __m128i v = _mm_loadu_si128(reinterpret_cast<const __m128i*>(src + i));
+        _mm_stream_si128(reinterpret_cast<__m128i*>(dst + i), _mm_unpacklo_epi8(v, zero));
+        _mm_stream_si128(reinterpret_cast<__m128i*>(dst + i + 8), _mm_unpackhi_epi8(v, zero));
+    }
+    _mm_sfence();
+#endif
+    for (; i < n; ++i) dst[i] = src[i];
+}
+
+}  // namespace
 
 Session::Impl* Session::Impl::current() { return tCurrent; }
 
@@ -378,10 +404,14 @@ void Session::Impl::settleImage() {
         return;
     }
     if (!result_.ok()) return;
-    // Only the selection can have changed.
+    // Only the selection can have changed; across the whole width its rows are one run.
+    const bool wholeRows = filterArea_.left == 0 && filterArea_.right == dest_.width;
     const std::size_t n = std::size_t(filterArea_.width()) * std::size_t(dest_.channels);
-    for (int y = filterArea_.top; y < filterArea_.bottom; ++y)
-        std::copy_n(target_.at(filterArea_.left, y), n, &dest_.samples[dest_.index(filterArea_.left, y)]);
+    for (int y = filterArea_.top; y < filterArea_.bottom; ++y) {
+        const std::size_t count = wholeRows ? n * std::size_t(filterArea_.height()) : n;
+        widen(target_.at(filterArea_.left, y), &dest_.samples[dest_.index(filterArea_.left, y)], count);
+        if (wholeRows) break;
+    }
 }
 
 Session::Session(Image& image, RunOptions options) : impl_(std::make_unique<Impl>(image, std::move(options))) {}
