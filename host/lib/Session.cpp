@@ -250,6 +250,21 @@ bool Session::Impl::anyRectRequested() const {
            !Area::of(record_.maskRect).empty();
 }
 
+std::string Session::Impl::serve(const Raster& image, const Area& area, int lo, int hi, int padding, bool inPlaceAllowed,
+                                 std::vector<std::uint8_t>& buffer, void*& data, std::int32_t& rowBytes,
+                                 bool& copied) const {
+    if (std::string error = checkRequest(image, area, lo, hi, padding); !error.empty()) return error;
+    if (inPlaceAllowed && !options_.copyTiles && servedInPlace(image, area, lo, hi)) {
+        data = image.at(area.left, area.top);
+        rowBytes = std::int32_t(image.rowBytes);
+        return {};
+    }
+    if (std::string error = fillArea(image, area, lo, hi, padding, buffer, rowBytes); !error.empty()) return error;
+    data = buffer.data();
+    copied = true;
+    return {};
+}
+
 pi::OSErr Session::Impl::serveRequest() {
     pi::FilterRecord& r = record_;
     if (r.inputRate > kFixedOne)
@@ -260,17 +275,10 @@ pi::OSErr Session::Impl::serveRequest() {
     r.inData = nullptr;
     r.inRowBytes = 0;
     if (!in.empty()) {
-        if (std::string error = checkRequest(source_, in, r.inLoPlane, r.inHiPlane, r.inputPadding); !error.empty())
-            return hostFault("input: " + error);
-        if (!options_.copyTiles && servedInPlace(source_, in, r.inLoPlane, r.inHiPlane)) {
-            r.inData = source_.at(in.left, in.top);
-            r.inRowBytes = std::int32_t(source_.rowBytes);
-        } else {
-            const std::string error =
-                fillArea(source_, in, r.inLoPlane, r.inHiPlane, r.inputPadding, inBuffer_, r.inRowBytes);
-            if (!error.empty()) return hostFault("input: " + error);
-            r.inData = inBuffer_.data();
-        }
+        bool copied = false;
+        const std::string error = serve(source_, in, r.inLoPlane, r.inHiPlane, r.inputPadding, true, inBuffer_,
+                                        r.inData, r.inRowBytes, copied);
+        if (!error.empty()) return hostFault("input: " + error);
         r.inPlaneBytes = bytesPerSample;
         r.inColumnBytes = (r.inHiPlane - r.inLoPlane + 1) * bytesPerSample;
     }
@@ -280,21 +288,12 @@ pi::OSErr Session::Impl::serveRequest() {
     r.outRowBytes = 0;
     pending_.active = false;
     if (!out.empty()) {
-        if (std::string error = checkRequest(target_, out, r.outLoPlane, r.outHiPlane, r.outputPadding);
-            !error.empty())
-            return hostFault("output: " + error);
         // In place only inside the selection: pixels outside it must never change.
-        if (!options_.copyTiles && servedInPlace(target_, out, r.outLoPlane, r.outHiPlane) &&
-            out.within(filterArea_)) {
-            r.outData = target_.at(out.left, out.top);
-            r.outRowBytes = std::int32_t(target_.rowBytes);
-        } else {
-            const std::string error =
-                fillArea(target_, out, r.outLoPlane, r.outHiPlane, r.outputPadding, outBuffer_, r.outRowBytes);
-            if (!error.empty()) return hostFault("output: " + error);
-            r.outData = outBuffer_.data();
-            pending_ = {out, r.outLoPlane, r.outHiPlane, r.outRowBytes, true};
-        }
+        bool copied = false;
+        const std::string error = serve(target_, out, r.outLoPlane, r.outHiPlane, r.outputPadding,
+                                        out.within(filterArea_), outBuffer_, r.outData, r.outRowBytes, copied);
+        if (!error.empty()) return hostFault("output: " + error);
+        if (copied) pending_ = {out, r.outLoPlane, r.outHiPlane, r.outRowBytes, true};
         r.outPlaneBytes = bytesPerSample;
         r.outColumnBytes = (r.outHiPlane - r.outLoPlane + 1) * bytesPerSample;
     }

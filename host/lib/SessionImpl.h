@@ -60,6 +60,10 @@ private:
     bool call(pi::int16 selector);
     bool anyRectRequested() const;
     pi::OSErr serveRequest();
+    // Points `data` into `image` for the request, or fills `buffer` with it (`copied`); the error
+    // that refuses the request, if any.
+    std::string serve(const Raster& image, const Area& area, int lo, int hi, int padding, bool inPlaceAllowed,
+                      std::vector<std::uint8_t>& buffer, void*& data, std::int32_t& rowBytes, bool& copied) const;
     void commitPending();
     pi::OSErr hostFault(const std::string& message, pi::OSErr code = pi::paramErr);
     void collectPar1();

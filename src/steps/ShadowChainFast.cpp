@@ -311,23 +311,23 @@ __attribute__((target("avx2"))) void mixRgbAvx2(const uint16_t* __restrict input
     }
 }
 
+template <class S>
+void mixRgb(const uint16_t* in, const uint16_t* blur, size_t plane, int32_t n, S* out) {
+    static const bool avx2 = __builtin_cpu_supports("avx2");
+    if (avx2)
+        mixRgbAvx2<S>(in, blur, plane, n, out);
+    else
+        mixSpan<S, 3>(in, blur, plane, 3, n, out);
+}
 template <>
 void cKernels<uint8_t, 3>::mix(const uint16_t* in, const uint16_t* blur, size_t plane, int32_t, int32_t n,
                                uint8_t* out) {
-    static const bool avx2 = __builtin_cpu_supports("avx2");
-    if (avx2)
-        mixRgbAvx2<uint8_t>(in, blur, plane, n, out);
-    else
-        mixSpan<uint8_t, 3>(in, blur, plane, 3, n, out);
+    mixRgb(in, blur, plane, n, out);
 }
 template <>
 void cKernels<uint16_t, 3>::mix(const uint16_t* in, const uint16_t* blur, size_t plane, int32_t, int32_t n,
                                 uint16_t* out) {
-    static const bool avx2 = __builtin_cpu_supports("avx2");
-    if (avx2)
-        mixRgbAvx2<uint16_t>(in, blur, plane, n, out);
-    else
-        mixSpan<uint16_t, 3>(in, blur, plane, 3, n, out);
+    mixRgb(in, blur, plane, n, out);
 }
 #endif
 
