@@ -275,10 +275,15 @@ pi::OSErr Session::Impl::serveRequest() {
     r.inData = nullptr;
     r.inRowBytes = 0;
     if (!in.empty()) {
+        // The record is packed: its fields are not bound to references.
+        void* data = nullptr;
+        std::int32_t rowBytes = 0;
         bool copied = false;
-        const std::string error = serve(source_, in, r.inLoPlane, r.inHiPlane, r.inputPadding, true, inBuffer_,
-                                        r.inData, r.inRowBytes, copied);
+        const std::string error =
+            serve(source_, in, r.inLoPlane, r.inHiPlane, r.inputPadding, true, inBuffer_, data, rowBytes, copied);
         if (!error.empty()) return hostFault("input: " + error);
+        r.inData = data;
+        r.inRowBytes = rowBytes;
         r.inPlaneBytes = bytesPerSample;
         r.inColumnBytes = (r.inHiPlane - r.inLoPlane + 1) * bytesPerSample;
     }
@@ -289,10 +294,14 @@ pi::OSErr Session::Impl::serveRequest() {
     pending_.active = false;
     if (!out.empty()) {
         // In place only inside the selection: pixels outside it must never change.
+        void* data = nullptr;
+        std::int32_t rowBytes = 0;
         bool copied = false;
         const std::string error = serve(target_, out, r.outLoPlane, r.outHiPlane, r.outputPadding,
-                                        out.within(filterArea_), outBuffer_, r.outData, r.outRowBytes, copied);
+                                        out.within(filterArea_), outBuffer_, data, rowBytes, copied);
         if (!error.empty()) return hostFault("output: " + error);
+        r.outData = data;
+        r.outRowBytes = rowBytes;
         if (copied) pending_ = {out, r.outLoPlane, r.outHiPlane, r.outRowBytes, true};
         r.outPlaneBytes = bytesPerSample;
         r.outColumnBytes = (r.outHiPlane - r.outLoPlane + 1) * bytesPerSample;
