@@ -20,5 +20,20 @@ set(CMAKE_SHARED_LINKER_FLAGS_INIT "-static")
 set(CMAKE_MODULE_LINKER_FLAGS_INIT "-static")
 # Runs the cross-built tools through Wine when CMake needs to.
 set(CMAKE_CROSSCOMPILING_EMULATOR wine)
-# PE has no ifunc, so GCC cannot dispatch target_clones there (see windows/NoTargetClones.h).
-set(CMAKE_CXX_FLAGS_INIT "-include ${CMAKE_CURRENT_LIST_DIR}/../windows/NoTargetClones.h")
+# Boost and RapidXML are used header-only, and their headers are the same for every target: the
+# build machine's copies serve, through a folder that exposes only them, not the rest of /usr/include.
+set(_header_only ${CMAKE_BINARY_DIR}/header-only)
+foreach(_lib boost rapidxml)
+  if(EXISTS /usr/include/${_lib} AND NOT EXISTS ${_header_only}/${_lib})
+    file(MAKE_DIRECTORY ${_header_only})
+    file(CREATE_LINK /usr/include/${_lib} ${_header_only}/${_lib} SYMBOLIC)
+  endif()
+endforeach()
+set(CMAKE_CXX_FLAGS_INIT "-isystem ${_header_only}")
+# The dialog's libraries (Expat, static wxMSW), built by scripts/windows-ui-deps.sh into one prefix.
+set(CMAKE_TRY_COMPILE_PLATFORM_VARIABLES NOCTIVA_WIN_DEPS)
+if(NOCTIVA_WIN_DEPS)
+  list(APPEND CMAKE_FIND_ROOT_PATH ${NOCTIVA_WIN_DEPS})
+  # Not the build machine's wx-config, which a program search would find first.
+  set(wxWidgets_CONFIG_EXECUTABLE ${NOCTIVA_WIN_DEPS}/bin/wx-config CACHE FILEPATH "")
+endif()

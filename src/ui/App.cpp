@@ -1,6 +1,10 @@
 #include "ui/App.h"
 
+#ifdef _WIN32
+#include <windows.h>
+#else
 #include <dlfcn.h>
+#endif
 
 #include <clocale>
 #include <cstdlib>
@@ -23,7 +27,35 @@ namespace {
 enum class Toolkit { NotStarted, Running, Unavailable };
 Toolkit gToolkit = Toolkit::NotStarted;
 
-bool displayNamed() {
+#ifdef _WIN32
+// A service's invisible window station, or a session where no window can be made (Wine without
+// an X server), has no one to click the dialog: it would wait for ever.
+bool displayAvailable() {
+    USEROBJECTFLAGS flags{};
+    HWINSTA station = GetProcessWindowStation();
+    if (station != nullptr &&
+        GetUserObjectInformationW(station, UOI_FLAGS, &flags, sizeof flags, nullptr) &&
+        (flags.dwFlags & WSF_VISIBLE) == 0)
+        return false;
+    HWND probe = CreateWindowExW(0, L"STATIC", L"", WS_POPUP, 0, 0, 1, 1, nullptr, nullptr, nullptr, nullptr);
+    if (probe == nullptr) return false;
+    DestroyWindow(probe);
+    return true;
+}
+
+HMODULE thisModule(DWORD extraFlags) {
+    HMODULE module = nullptr;
+    if (!GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS | extraFlags,
+                            reinterpret_cast<LPCWSTR>(&thisModule), &module))
+        return nullptr;
+    return module;
+}
+
+// The toolkit's window classes point into this module, and nothing unregisters them: a host that
+// unloads the module would leave them pointing at freed code.
+void pinModule() { thisModule(GET_MODULE_HANDLE_EX_FLAG_PIN); }
+#else
+bool displayAvailable() {
     for (const char* variable : {"DISPLAY", "WAYLAND_DISPLAY"}) {
         const char* value = std::getenv(variable);
         if (value != nullptr && *value != '\0') return true;
@@ -38,6 +70,7 @@ void pinModule() {
     if (dladdr(reinterpret_cast<const void*>(&pinModule), &info) == 0 || info.dli_fname == nullptr) return;
     if (void* self = dlopen(info.dli_fname, RTLD_NOW | RTLD_NOLOAD | RTLD_NODELETE)) dlclose(self);
 }
+#endif
 
 // A failed toolkit check inside a host must not pop up assertion dialogs.
 void logAssertion(const wxString& file, int line, const wxString& func, const wxString& cond, const wxString& msg) {
@@ -54,7 +87,7 @@ bool StartToolkit() {
         gToolkit = Toolkit::Running;
         return true;
     }
-    if (!displayNamed()) {
+    if (!displayAvailable()) {
         gToolkit = Toolkit::Unavailable;
         return false;
     }
@@ -63,10 +96,15 @@ bool StartToolkit() {
     const char* current = std::setlocale(LC_ALL, nullptr);
     const std::string hostLocale = current != nullptr ? current : "C";
 
+#ifdef _WIN32
+    // The toolkit registers its window classes for the instance it is given: this module, not the host.
+    bool started = wxEntryStart(thisModule(GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT));
+#else
     static char programName[] = "Noctiva";
     static char* arguments[] = {programName, nullptr};
     int count = 1;
     bool started = wxEntryStart(count, arguments);
+#endif
     if (started && (wxTheApp == nullptr || !wxTheApp->CallOnInit())) {
         wxEntryCleanup();
         started = false;

@@ -7,6 +7,9 @@
 #include <wx/config.h>
 #include <wx/fileconf.h>
 #include <wx/nativewin.h>
+#ifdef __WXMSW__
+#include <wx/msw/registry.h>
+#endif
 
 #include "lib/debug/Log.h"
 #include "lib/filesystem/Path.h"
@@ -27,7 +30,9 @@ constexpr const char* kCreateLayerText = "@Quell2.WarningsErrors.ErrorCreateLaye
 constexpr const char* kTitleKey = "@Quell2.WarningsErrors.TitleWarning";
 constexpr const char* kCreateLayerSetting = "ShowErrorCreateLayer";
 
+#ifndef __WXMSW__
 wxString fromPath(const fs::path& path) { return wxString::FromUTF8(vek::filesystem::utf8FromPath(path)); }
+#endif
 
 fs::path storePath(const char* application) {
     const fs::path base = vek::filesystem::SpecialFolders::userPreferences();
@@ -60,9 +65,22 @@ void copyEntries(wxConfigBase& from, wxConfigBase& to) {
     from.SetPath("/");
 }
 
+#ifdef __WXMSW__
+// Whether an application's registry-backed store was ever written (HKCU\Software\<vendor>\<application>).
+bool storeExists(const char* application) {
+    return wxRegKey(wxRegKey::HKCU, wxString("Software\\") + kVendor + "\\" + application).Exists();
+}
+#endif
+
 std::unique_ptr<wxConfigBase> makeStore() {
 #ifdef __WXMSW__
-    return std::make_unique<wxConfig>(kApplication, kVendor);
+    const bool fresh = !storeExists(kApplication);
+    auto store = std::make_unique<wxConfig>(kApplication, kVendor);
+    if (fresh && storeExists(kFormerApplication)) {
+        wxConfig previous(kFormerApplication, kVendor);
+        copyEntries(previous, *store);
+    }
+    return store;
 #else
     const fs::path file = storePath(kApplication);
     if (file.empty()) return std::make_unique<wxFileConfig>(kApplication, kVendor);

@@ -1,6 +1,10 @@
 #include "ui/Localization.h"
 
+#ifdef _WIN32
+#include <windows.h>
+#else
 #include <dlfcn.h>
+#endif
 
 #include <exception>
 #include <fstream>
@@ -196,13 +200,43 @@ std::wstring Translate(std::string_view key) {
 
 void ReleaseLocalization() { gCatalog.reset(); }
 
+namespace {
+
+// The file that holds this function, as the loader names it; empty if it cannot say.
+fs::path moduleFile() {
+#ifdef _WIN32
+    HMODULE module = nullptr;
+    if (!GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS | GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT,
+                            reinterpret_cast<LPCWSTR>(&moduleFile), &module))
+        return {};
+    // The name is cut short, not failed, when the buffer is too small: grow until it fits.
+    std::wstring name(MAX_PATH, L'\0');
+    for (;;) {
+        const DWORD length = GetModuleFileNameW(module, name.data(), DWORD(name.size()));
+        if (length == 0) return {};
+        if (length < name.size()) {
+            name.resize(length);
+            return fs::path(name);
+        }
+        if (name.size() >= 32768) return {};  // longer than any Windows path
+        name.resize(name.size() * 2);
+    }
+#else
+    Dl_info info{};
+    if (dladdr(reinterpret_cast<const void*>(&moduleFile), &info) == 0 || info.dli_fname == nullptr) return {};
+    return fs::path(info.dli_fname);
+#endif
+}
+
+}  // namespace
+
 fs::path ModuleFolder() {
     // The catalogue files are installed beside the module, and the module is the one thing whose
     // place is known whatever host loaded it: ask the loader which file holds this function.
-    Dl_info info{};
-    if (dladdr(reinterpret_cast<const void*>(&ModuleFolder), &info) == 0 || info.dli_fname == nullptr) return {};
+    const fs::path named = moduleFile();
+    if (named.empty()) return {};
     std::error_code ec;
-    fs::path file = fs::weakly_canonical(fs::path(info.dli_fname), ec);
-    if (ec) file = fs::path(info.dli_fname);
+    fs::path file = fs::weakly_canonical(named, ec);
+    if (ec) file = named;
     return file.parent_path();
 }
