@@ -5,7 +5,8 @@
 #     byte for byte;
 #   - noctiva.exe under Wine runs the module over the bundled sample and a 16-bit RGBA image, with
 #     the default settings and with settings that use every step, and writes the same files, bit for
-#     bit, as the Linux host with the Linux module.
+#     bit, as the Linux host with the Linux module;
+#   - a module that faults ends the run with status 3; refused host memory ends it with -108.
 # Usage: scripts/windows-test.sh [LINUX_BUILD]   (default build-linux-check; built here if missing)
 set -euo pipefail
 root="$(cd "$(dirname "$0")/.." && pwd)"
@@ -20,12 +21,13 @@ fail() { echo "FAIL $1"; failures=$((failures + 1)); }
 for f in "$win/host/Noctiva.8bf" "$win/host/noctiva.exe"; do
     [ -f "$f" ] || { echo "windows-test: $f missing; run scripts/windows-build.sh" >&2; exit 2; }
 done
-if [ ! -x "$linux/host/noctiva" ] || [ ! -f "$linux/host/Noctiva.so" ]; then
-    start=$SECONDS
+# The reference is built from the same sources (a no-op when it is up to date).
+start=$SECONDS
+if [ ! -f "$linux/CMakeCache.txt" ]; then
     cmake -S "$root" -B "$linux" -DNOCTIVA_BUILD_TESTS=OFF -DNOCTIVA_BUILD_BENCH=OFF -DNOCTIVA_BUILD_GIMP=OFF >/dev/null
-    cmake --build "$linux" --target Noctiva noctiva -j"$jobs"
-    echo "windows-test: Linux build took $((SECONDS - start)) s"
 fi
+cmake --build "$linux" --target Noctiva noctiva -j"$jobs" >/dev/null
+echo "windows-test: Linux build took $((SECONDS - start)) s"
 module="$win/host/Noctiva.8bf"
 work="$win/wine-check"
 rm -rf "$work"
@@ -134,6 +136,18 @@ if [ "$status" -eq 3 ] && grep -q "crashed with exception 0xC0000005" "$work/cra
     pass "a faulting module ends the run with status 3 and a message"
 else
     fail "a faulting module: status $status, $(head -2 "$work/crash.err")"
+fi
+
+# Memory the host refuses (a buffer, a handle, a lock) ends the run with -108, gives everything back
+# and leaves the image alone: every point on a small image, three points on each sample file.
+x86_64-w64-mingw32-g++-posix -std=c++20 -O1 -static -I"$root/host/include" -I"$root/src" \
+    -o "$work/refused-memory-check.exe" "$root/tests/windows/RefusedMemoryCheck.cpp" "$win/host/libnoctiva_host.a"
+start=$SECONDS
+if (cd "$work" && timeout 600 wine refused-memory-check.exe "$(winepath -w "$module")" sample8.pam sample16.pam) >"$work/refused.out" 2>&1; then
+    tr -d '\r' <"$work/refused.out" | head -n -1 | sed 's/^/    /'
+    pass "refused memory ends the run with -108, cleanly: $(tr -d '\r' <"$work/refused.out" | tail -1) ($((SECONDS - start)) s)"
+else
+    fail "refused memory: $(tr -d '\r' <"$work/refused.out" | head -5)"
 fi
 
 echo "$passed passed, $failures failed"
