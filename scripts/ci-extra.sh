@@ -1,8 +1,10 @@
 #!/usr/bin/env bash
 # The CI stages after the plain test run: the whole suite again in an AddressSanitizer +
 # UndefinedBehaviorSanitizer build (LeakSanitizer included, so every test that loads the module
-# through our host is leak-checked), then each fuzz target for a bounded time.
+# through our host is leak-checked), then each fuzz target for a bounded time, then the Windows
+# module with its dialog, cross-built and checked under Wine against the Linux build.
 #   NOCTIVA_FUZZ_SECONDS  seconds per fuzz target (default 60; 0 skips the fuzz stage)
+#   NOCTIVA_WINDOWS       0 skips the Windows stages (default 1)
 set -euo pipefail
 root=$(cd "$(dirname "$0")/.." && pwd)
 fuzzSeconds=${NOCTIVA_FUZZ_SECONDS:-60}
@@ -36,5 +38,16 @@ stage sanitizer-tests sanitizerTests
 if [ "$fuzzSeconds" -gt 0 ]; then
   stage fuzz-build "$root/scripts/fuzz.sh" 0
   stage fuzz-runs "$root/scripts/fuzz.sh" "$fuzzSeconds"
+fi
+if [ "${NOCTIVA_WINDOWS:-1}" != 0 ]; then
+  # Packages, then Expat and wxMSW from Debian's source packages (kept in build-win/deps).
+  windowsDeps() { bash "$root/scripts/windows-deps.sh" && bash "$root/scripts/windows-ui-deps.sh"; }
+  # The release tree of scripts/test.sh is the Linux reference when it is there.
+  linuxReference=$root/build-linux-check
+  [ -x "$root/build/host/noctiva" ] && linuxReference=$root/build
+  stage windows-deps windowsDeps
+  stage windows-build bash "$root/scripts/windows-build.sh"
+  stage windows-tests bash "$root/scripts/windows-test.sh" "$linuxReference"
+  stage windows-dialog bash "$root/scripts/windows-dialog-test.sh"
 fi
 report

@@ -20,7 +20,7 @@ for f in "$win/host/Noctiva.8bf" "$win/host/noctiva.exe"; do
     [ -f "$f" ] || { echo "windows-dialog-test: $f missing; run scripts/windows-build.sh" >&2; exit 2; }
 done
 if ! grep -q '^NOCTIVA_WITH_UI:BOOL=ON$' "$win/CMakeCache.txt"; then
-    echo "windows-dialog-test: $win was built without the dialog (scripts/windows-build.sh --with-dialog)" >&2
+    echo "windows-dialog-test: $win was built without the dialog; run scripts/windows-build.sh" >&2
     exit 2
 fi
 rm -rf "$work"
@@ -57,8 +57,11 @@ wineserver -k >/dev/null 2>&1 || true
 store='HKCU\Software\Corvid\Quell 2 Common'
 timeout 60 wine reg delete 'HKCU\Software\Corvid' /f >/dev/null 2>&1 || true
 appdata=$(timeout 60 wine cmd /c echo %APPDATA% 2>/dev/null | tr -d '\r')
-settings_dir=$(winepath -u "$appdata\\Corvid\\Quell 2" 2>/dev/null)
-rm -rf "$settings_dir"
+settings_dir=$(winepath -u "$appdata\\Corvid\\Quell 2" 2>/dev/null || true)
+case "$appdata|$settings_dir" in
+    [A-Za-z]:\\*"|/"*) rm -rf "$settings_dir" ;;
+    *) echo "windows-dialog-test: no application-data folder in $WINEPREFIX ('$appdata')" >&2; exit 2 ;;
+esac
 # A choice made under the product's earlier store name, carried over when the store is first made.
 timeout 60 wine reg add 'HKCU\Software\Corvid\Quell 2' /v EarlierChoice /t REG_DWORD /d 0 /f >/dev/null 2>&1
 # No window manager runs on Xvfb: Wine draws the title bars itself, so the screenshots show them.

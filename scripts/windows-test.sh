@@ -139,7 +139,7 @@ else
 fi
 
 # Memory the host refuses (a buffer, a handle, a lock) ends the run with -108, gives everything back
-# and leaves the image alone: every point on a small image, three points on each sample file.
+# and leaves the image alone: every point a run reaches, on a small image and on both sample files.
 x86_64-w64-mingw32-g++-posix -std=c++20 -O1 -static -I"$root/host/include" -I"$root/src" \
     -o "$work/refused-memory-check.exe" "$root/tests/windows/RefusedMemoryCheck.cpp" "$win/host/libnoctiva_host.a"
 start=$SECONDS

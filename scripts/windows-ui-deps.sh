@@ -26,8 +26,11 @@ fetch() {
     fi
     mkdir -p "$deps/src"
     cd "$deps/src"
-    ls -d expat-*/ >/dev/null 2>&1 || apt-get source -qq expat
-    ls -d wxwidgets3.2-*/ >/dev/null 2>&1 || apt-get source -qq wxwidgets3.2
+    local package
+    for package in expat wxwidgets3.2; do
+        ls -d "$package"-*/ >/dev/null 2>&1 && continue
+        apt-get source -qq "$package" >"fetch-$package.log" 2>&1 || { tail -20 "fetch-$package.log"; return 1; }
+    done
 }
 
 step "source packages" fetch
