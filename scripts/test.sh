@@ -1,6 +1,7 @@
 #!/usr/bin/env bash
 # Installs what is missing, builds, and runs every test; then the sanitizer build with the whole
-# suite again and the bounded fuzz runs (scripts/ci-extra.sh; NOCTIVA_QUICK=1 skips them).
+# suite again, the bounded fuzz runs and the Windows module under Wine (scripts/ci-extra.sh;
+# NOCTIVA_QUICK=1 skips them).
 # Prints how long each stage took.
 set -euo pipefail
 root=$(cd "$(dirname "$0")/.." && pwd)
