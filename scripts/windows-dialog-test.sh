@@ -11,14 +11,8 @@ set -euo pipefail
 root="$(cd "$(dirname "$0")/.." && pwd)"
 win="${NOCTIVA_WIN_BUILD:-$root/build-win}"
 work="$win/dialog-test"
-failures=0
-passed=0
-pass() { echo "PASS $1"; passed=$((passed + 1)); }
-fail() { echo "FAIL $1"; failures=$((failures + 1)); }
-
-for f in "$win/host/Noctiva.8bf" "$win/host/noctiva.exe"; do
-    [ -f "$f" ] || { echo "windows-dialog-test: $f missing; run scripts/windows-build.sh" >&2; exit 2; }
-done
+checks=windows-dialog-test
+source "$root/scripts/windows-checks.sh"
 if ! grep -q '^NOCTIVA_WITH_UI:BOOL=ON$' "$win/CMakeCache.txt"; then
     echo "windows-dialog-test: $win was built without the dialog; run scripts/windows-build.sh" >&2
     exit 2
@@ -191,5 +185,4 @@ else
     fail "headless run: status $status, $(head -3 "$work/headless.err")"
 fi
 
-echo "$passed passed, $failures failed"
-[ "$failures" -eq 0 ]
+summary

@@ -13,14 +13,8 @@ root="$(cd "$(dirname "$0")/.." && pwd)"
 win="${NOCTIVA_WIN_BUILD:-$root/build-win}"
 linux="${1:-$root/build-linux-check}"
 jobs="${NOCTIVA_JOBS:-2}"
-failures=0
-passed=0
-pass() { echo "PASS $1"; passed=$((passed + 1)); }
-fail() { echo "FAIL $1"; failures=$((failures + 1)); }
-
-for f in "$win/host/Noctiva.8bf" "$win/host/noctiva.exe"; do
-    [ -f "$f" ] || { echo "windows-test: $f missing; run scripts/windows-build.sh" >&2; exit 2; }
-done
+checks=windows-test
+source "$root/scripts/windows-checks.sh"
 # The reference is built from the same sources (a no-op when it is up to date).
 start=$SECONDS
 if [ ! -f "$linux/CMakeCache.txt" ]; then
@@ -150,5 +144,4 @@ else
     fail "refused memory: $(tr -d '\r' <"$work/refused.out" | head -5)"
 fi
 
-echo "$passed passed, $failures failed"
-[ "$failures" -eq 0 ]
+summary
