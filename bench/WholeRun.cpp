@@ -59,7 +59,7 @@ void generate(Image& image, uint32_t seed) {
                          {int(next() % 256), int(next() % 256), int(next() % 256)}});
     }
     for (int y = 0; y < h; ++y) {
-        uint16_t* row = image.samples.data() + size_t(y) * size_t(w) * 3;
+        const size_t row = size_t(y) * size_t(w) * 3;
         for (int x = 0; x < w; ++x) {
             int c[3] = {x * 200 / w + 20, y * 180 / h + 30, (x + y) * 120 / (w + h) + 60};
             for (const Disc& d : discs) {
@@ -74,8 +74,8 @@ void generate(Image& image, uint32_t seed) {
             for (int k = 0; k < 3; ++k) {
                 const int n = int((noise >> (8 * k)) & 31) - 16;  // +-16 in 8-bit steps
                 const int v8 = std::clamp(c[k] + n, 0, 255);
-                row[3 * x + k] = uint16_t(image.depth == 16 ? (uint32_t(v8) * maxv + int32_t(noise >> 24)) / 256 : v8);
-                if (row[3 * x + k] > maxv) row[3 * x + k] = uint16_t(maxv);
+                const uint32_t v = image.depth == 16 ? (uint32_t(v8) * maxv + int32_t(noise >> 24)) / 256 : uint32_t(v8);
+                image.setSample(row + 3 * size_t(x) + size_t(k), uint16_t(std::min<uint32_t>(v, maxv)));
             }
         }
     }

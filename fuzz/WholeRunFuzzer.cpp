@@ -66,23 +66,24 @@ void fillImage(FuzzedDataProvider& in, Image& image) {
     std::mt19937 random(in.ConsumeIntegral<uint32_t>());
     switch (in.ConsumeIntegralInRange(0, 3)) {
         case 0:  // noise over the whole range
-            for (auto& s : image.samples) s = uint16_t(random() % unsigned(maxValue + 1));
+            for (size_t i = 0; i < image.sampleCount(); ++i) image.setSample(i, uint16_t(random() % unsigned(maxValue + 1)));
             break;
         case 1: {  // flat: zero spans and uniform windows
             const uint16_t v = in.ConsumeIntegralInRange<uint16_t>(0, uint16_t(maxValue));
-            for (auto& s : image.samples) s = v;
+            for (size_t i = 0; i < image.sampleCount(); ++i) image.setSample(i, v);
             break;
         }
         case 2:  // a gradient with a little noise
             for (int y = 0; y < image.height; ++y)
                 for (int x = 0; x < image.width; ++x)
                     for (int c = 0; c < image.channels; ++c)
-                        image.at(x, y, c) = uint16_t(
-                            ((x + y * 3 + c * 17) * maxValue / (image.width + image.height * 3 + 51) + random() % 3) %
-                            (maxValue + 1));
+                        image.set(x, y, c,
+                                  uint16_t(((x + y * 3 + c * 17) * maxValue / (image.width + image.height * 3 + 51) +
+                                            random() % 3) %
+                                           (maxValue + 1)));
             break;
         default:  // black and white extremes
-            for (auto& s : image.samples) s = (random() & 1) ? uint16_t(maxValue) : 0;
+            for (size_t i = 0; i < image.sampleCount(); ++i) image.setSample(i, (random() & 1) ? uint16_t(maxValue) : 0);
             break;
     }
 }

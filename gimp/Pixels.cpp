@@ -27,14 +27,14 @@ void checkArea(const Image& image, const Selection& a) {
 Image hostImageFrom8(std::span<const std::uint8_t> samples, int width, int height, int channels) {
     checkShape(samples.size(), width, height, channels);
     Image image(width, height, channels, 8);
-    for (std::size_t i = 0; i < samples.size(); ++i) image.samples[i] = samples[i];
+    image.samples8.assign(samples.begin(), samples.end());
     return image;
 }
 
 Image hostImageFrom16(std::span<const std::uint16_t> samples, int width, int height, int channels) {
     checkShape(samples.size(), width, height, channels);
     Image image(width, height, channels, 16);
-    for (std::size_t i = 0; i < samples.size(); ++i) image.samples[i] = noctiva::host::hostFromFile16(samples[i]);
+    for (std::size_t i = 0; i < samples.size(); ++i) image.samples16[i] = noctiva::host::hostFromFile16(samples[i]);
     return image;
 }
 
@@ -45,8 +45,7 @@ std::vector<std::uint8_t> areaSamples8(const Image& filtered, const Selection& a
     for (int y = area.y; y < area.y + area.height; ++y)
         for (int x = area.x; x < area.x + area.width; ++x)
             for (int c = 0; c < filtered.channels; ++c) {
-                const std::uint16_t v = filtered.at(x, y, c);
-                out.push_back(std::uint8_t(v > 255 ? 255 : v));  // as the command's 8-bit writer
+                out.push_back(std::uint8_t(filtered.at(x, y, c)));
             }
     return out;
 }
@@ -54,7 +53,7 @@ std::vector<std::uint8_t> areaSamples8(const Image& filtered, const Selection& a
 std::vector<std::uint16_t> areaSamples16(const Image& filtered, std::span<const std::uint16_t> original,
                                          const Selection& area) {
     checkArea(filtered, area);
-    if (original.size() != filtered.samples.size())
+    if (original.size() != filtered.sampleCount())
         throw std::invalid_argument("original samples do not match the image");
     std::vector<std::uint16_t> out;
     out.reserve(std::size_t(area.width) * std::size_t(area.height) * std::size_t(filtered.channels));
@@ -63,7 +62,7 @@ std::vector<std::uint16_t> areaSamples16(const Image& filtered, std::span<const 
         const std::size_t last = first + std::size_t(area.width) * std::size_t(filtered.channels);
         for (std::size_t i = first; i < last; ++i) {
             // The rule of the command's writer (fileSamples16): an untouched sample keeps its value.
-            const std::uint16_t h = filtered.samples[i];
+            const std::uint16_t h = filtered.sample(i);
             out.push_back(noctiva::host::hostFromFile16(original[i]) == h ? original[i]
                                                                            : noctiva::host::fileFromHost16(h));
         }

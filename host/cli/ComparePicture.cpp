@@ -46,7 +46,7 @@ std::uint8_t to8(std::uint16_t sample, int depth) {
 void fillBox(Image& picture, int x0, int y0, int w, int h, std::uint16_t value) {
     for (int y = std::max(0, y0); y < std::min(picture.height, y0 + h); ++y)
         for (int x = std::max(0, x0); x < std::min(picture.width, x0 + w); ++x)
-            for (int c = 0; c < 3; ++c) picture.at(x, y, c) = value;
+            for (int c = 0; c < 3; ++c) picture.set(x, y, c, value);
 }
 
 // Copies `region` of `source` into `picture` at (dx, dy), columns [fromColumn, toColumn) only.
@@ -55,7 +55,7 @@ void blit(Image& picture, const Image& source, const Selection& region, int dx, 
     for (int y = 0; y < region.height; ++y)
         for (int x = fromColumn; x < toColumn; ++x)
             for (int c = 0; c < 3; ++c)
-                picture.at(dx + x, dy + y, c) = to8(source.at(region.x + x, region.y + y, c), source.depth);
+                picture.set(dx + x, dy + y, c, to8(source.at(region.x + x, region.y + y, c), source.depth));
 }
 
 }  // namespace

@@ -128,17 +128,17 @@ LoadedImage loadImage(const fs::path& path) {
     }
     checkExtent(loaded.image, name);
     if (loaded.image.depth == 16) {
-        loaded.original16 = loaded.image.samples;
-        for (auto& s : loaded.image.samples) s = hostFromFile16(s);
+        loaded.original16 = loaded.image.samples16;
+        for (auto& s : loaded.image.samples16) s = hostFromFile16(s);
     }
     return loaded;
 }
 
 std::vector<std::uint16_t> fileSamples16(const Image& image, const std::vector<std::uint16_t>& original16) {
-    std::vector<std::uint16_t> out(image.samples.size());
-    const bool haveOriginal = original16.size() == image.samples.size();
+    std::vector<std::uint16_t> out(image.sampleCount());
+    const bool haveOriginal = original16.size() == out.size();
     for (std::size_t i = 0; i < out.size(); ++i) {
-        const std::uint16_t h = image.samples[i];
+        const std::uint16_t h = image.sample(i);
         out[i] = haveOriginal && hostFromFile16(original16[i]) == h ? original16[i] : fileFromHost16(h);
     }
     return out;
@@ -149,7 +149,7 @@ void saveImage(const fs::path& path, const Image& image, FileFormat format, cons
     if ((image.channels != 3 && image.channels != 4) || (image.depth != 8 && image.depth != 16))
         throw HostError(name, "only RGB and RGBA images of 8 or 16 bits can be written");
     checkExtent(image, name);
-    if (image.samples.size() != std::size_t(image.width) * image.height * image.channels)
+    if (!image.samplesMatchSize())
         throw HostError(name, "image buffer does not match its size");
 
     Image fileImage;
@@ -158,7 +158,7 @@ void saveImage(const fs::path& path, const Image& image, FileFormat format, cons
         fileImage = Image(image.width, image.height, image.channels, 16);
         const bool sameShape = source && source->image.width == image.width &&
                                source->image.height == image.height && source->image.channels == image.channels;
-        fileImage.samples = fileSamples16(image, sameShape ? source->original16 : std::vector<std::uint16_t>{});
+        fileImage.samples16 = fileSamples16(image, sameShape ? source->original16 : std::vector<std::uint16_t>{});
         toWrite = &fileImage;
     }
 

@@ -78,7 +78,7 @@ Image readPam(std::FILE* file, const std::string& name) {
     for (int y = 0; y < height; ++y) {
         if (std::fread(row.data(), 1, row.size(), file) != row.size()) throw HostError(name, "PAM file is truncated");
         for (std::size_t i = 0; i < row.size(); i += bytesPerSample)
-            image.samples[at++] = bytesPerSample == 1 ? row[i] : std::uint16_t((row[i] << 8) | row[i + 1]);
+            image.setSample(at++, bytesPerSample == 1 ? row[i] : std::uint16_t((row[i] << 8) | row[i + 1]));
     }
     return image;
 }
@@ -91,10 +91,14 @@ void writePam(std::FILE* raw, const std::string& name, const Image& image) {
                                "\nDEPTH " + std::to_string(image.channels) + "\nMAXVAL " + (wide ? "65535" : "255") +
                                "\nTUPLTYPE " + (image.channels == 4 ? "RGB_ALPHA" : "RGB") + "\nENDHDR\n";
     std::vector<unsigned char> bytes;
-    bytes.reserve(image.samples.size() * (wide ? 2 : 1));
-    for (const std::uint16_t s : image.samples) {
-        if (wide) bytes.push_back((unsigned char)(s >> 8));
-        bytes.push_back((unsigned char)s);
+    if (wide) {
+        bytes.reserve(image.samples16.size() * 2);
+        for (const std::uint16_t s : image.samples16) {
+            bytes.push_back((unsigned char)(s >> 8));
+            bytes.push_back((unsigned char)s);
+        }
+    } else {
+        bytes = image.samples8;
     }
     const bool ok = std::fwrite(header.data(), 1, header.size(), file.get()) == header.size() &&
                     std::fwrite(bytes.data(), 1, bytes.size(), file.get()) == bytes.size();

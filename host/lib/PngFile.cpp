@@ -111,12 +111,12 @@ Image readPng(std::FILE* file, const std::string& name) {
         throw HostError(name, "unsupported PNG colour type: " + what + " (only RGB and RGBA)");
     }
     Image& image = read.image;
-    const std::size_t count = image.samples.size();
-    if (image.depth == 16)
-        for (std::size_t i = 0; i < count; ++i)
-            image.samples[i] = std::uint16_t((read.raw[i * 2] << 8) | read.raw[i * 2 + 1]);  // big-endian in the file
-    else
-        for (std::size_t i = 0; i < count; ++i) image.samples[i] = read.raw[i];
+    if (image.depth == 16) {
+        for (std::size_t i = 0; i < image.samples16.size(); ++i)
+            image.samples16[i] = std::uint16_t((read.raw[i * 2] << 8) | read.raw[i * 2 + 1]);  // big-endian in the file
+    } else {
+        image.samples8 = std::move(read.raw);  // rows of whole pixels, no padding
+    }
     return std::move(read.image);
 }
 
@@ -128,14 +128,15 @@ void writePng(int fd, const std::string& name, const Image& image) {
     }
     const int bytes = image.depth / 8;
     const std::size_t rowBytes = std::size_t(image.width) * image.channels * bytes;
-    std::vector<png_byte> raw(rowBytes * image.height);
-    for (std::size_t i = 0; i < image.samples.size(); ++i) {
-        if (bytes == 2) {
-            raw[i * 2] = png_byte(image.samples[i] >> 8);
-            raw[i * 2 + 1] = png_byte(image.samples[i] & 0xFF);
-        } else {
-            raw[i] = png_byte(image.samples[i] > 255 ? 255 : image.samples[i]);
+    std::vector<png_byte> raw;
+    if (bytes == 2) {
+        raw.resize(rowBytes * std::size_t(image.height));
+        for (std::size_t i = 0; i < image.samples16.size(); ++i) {
+            raw[i * 2] = png_byte(image.samples16[i] >> 8);
+            raw[i * 2 + 1] = png_byte(image.samples16[i] & 0xFF);
         }
+    } else {
+        raw = image.samples8;
     }
     std::vector<png_bytep> rows(image.height);
     for (int y = 0; y < image.height; ++y) rows[y] = raw.data() + std::size_t(y) * rowBytes;

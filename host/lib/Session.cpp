@@ -6,10 +6,6 @@
 #include <stdexcept>
 #include <utility>
 
-#if defined(__SSE2__)
-#include <emmintrin.h>
-#endif
-
 #include "SessionImpl.h"
 #include "noctiva/host/Module.h"
 #include "noctiva/host/ParentWindow.h"
@@ -89,27 +85,6 @@ std::string RunResult::message() const {
     return hostError;
 }
 
-namespace {
-
-// 8-bit samples into the image's 16-bit storage. The image is far larger than the caches, so the
-// stores bypass them (no read of the lines they overwrite).
-void widen(const std::uint8_t* src, std::uint16_t* dst, std::size_t n) {
-    std::size_t i = 0;
-#if defined(__SSE2__)
-    for (; i < n && (reinterpret_cast<std::uintptr_t>(dst + i) & 15) != 0; ++i) dst[i] = src[i];
-    const __m128i zero = _mm_setzero_si128();
-    for (; i + 16 <= n; i += 16) {
-        const __m128i v = _mm_loadu_si128(reinterpret_cast<const __m128i*>(src + i));
-        _mm_stream_si128(reinterpret_cast<__m128i*>(dst + i), _mm_unpacklo_epi8(v, zero));
-        _mm_stream_si128(reinterpret_cast<__m128i*>(dst + i + 8), _mm_unpackhi_epi8(v, zero));
-    }
-    _mm_sfence();
-#endif
-    for (; i < n; ++i) dst[i] = src[i];
-}
-
-}  // namespace
-
 Session::Impl* Session::Impl::current() { return tCurrent; }
 
 Session::Impl::Impl(Image& image, RunOptions options)
@@ -126,24 +101,18 @@ Session::Impl::Impl(Image& image, RunOptions options)
             throw std::invalid_argument("selection outside the image");
         filterArea_ = a;
     }
-    // The source snapshot (and, for 8-bit, the output) at the image's depth: tiles are served
-    // by pointing into them, with no conversion per tile.
+    // The source snapshot at the image's depth, and the image's own samples for the output: tiles
+    // are served by pointing into them, with no conversion per tile.
     const int bytesPerSample = image.depth / 8;
-    const std::size_t count = image.samples.size();
-    if (count != std::size_t(image.width) * std::size_t(image.height) * std::size_t(image.channels))
+    const std::size_t count = std::size_t(image.width) * std::size_t(image.height) * std::size_t(image.channels);
+    if (!image.samplesMatchSize())
         throw std::invalid_argument("image samples do not match its size");
-    sourceStore_.resize(count * std::size_t(bytesPerSample));
-    if (bytesPerSample == 2) {
-        std::memcpy(sourceStore_.data(), image.samples.data(), count * 2);
-    } else {
-        std::transform(image.samples.begin(), image.samples.end(), sourceStore_.begin(),
-                       [](std::uint16_t v) { return std::uint8_t(v); });
-        targetStore_ = sourceStore_;
-    }
+    std::uint8_t* const own = image.depth == 16 ? reinterpret_cast<std::uint8_t*>(image.samples16.data()) : image.samples8.data();
+    sourceStore_.assign(own, own + count * std::size_t(bytesPerSample));
     const std::size_t rowBytes = std::size_t(image.width) * std::size_t(image.channels * bytesPerSample);
     source_ = {sourceStore_.data(), image.width, image.height, image.channels, bytesPerSample, rowBytes};
     target_ = source_;
-    target_.data = bytesPerSample == 2 ? reinterpret_cast<std::uint8_t*>(image.samples.data()) : targetStore_.data();
+    target_.data = own;
     handles.failAllocationAt = options_.failHandleAllocation;
     buffers.cap = options_.bufferCap;
     buffers.failAllocationAt = options_.failBufferAllocation;
@@ -407,19 +376,7 @@ RunResult Session::Impl::run(PluginEntryProc entry) {
 
 void Session::Impl::settleImage() {
     // Tiles already stored by a run that then failed must not pass for a result.
-    if (source_.bytesPerSample == 2) {
-        if (!result_.ok()) std::memcpy(dest_.samples.data(), sourceStore_.data(), sourceStore_.size());
-        return;
-    }
-    if (!result_.ok()) return;
-    // Only the selection can have changed; across the whole width its rows are one run.
-    const bool wholeRows = filterArea_.left == 0 && filterArea_.right == dest_.width;
-    const std::size_t n = std::size_t(filterArea_.width()) * std::size_t(dest_.channels);
-    for (int y = filterArea_.top; y < filterArea_.bottom; ++y) {
-        const std::size_t count = wholeRows ? n * std::size_t(filterArea_.height()) : n;
-        widen(target_.at(filterArea_.left, y), &dest_.samples[dest_.index(filterArea_.left, y)], count);
-        if (wholeRows) break;
-    }
+    if (!result_.ok()) std::memcpy(target_.data, sourceStore_.data(), sourceStore_.size());
 }
 
 Session::Session(Image& image, RunOptions options) : impl_(std::make_unique<Impl>(image, std::move(options))) {}

@@ -72,9 +72,9 @@ private:
 
     Image& dest_;
     // The run's pixels at the image's depth. `source_` is the unchanged image every inData is read
-    // from; `target_` receives the output: the caller's own samples for 16-bit, a byte copy for
-    // 8-bit that goes back into the caller's image when the run succeeds.
-    std::vector<std::uint8_t> sourceStore_, targetStore_;
+    // from; `target_` is the caller's own samples, which receive the output (and get the source
+    // back when the run fails).
+    std::vector<std::uint8_t> sourceStore_;
     Raster source_, target_;
     RunOptions options_;
     RunResult result_;

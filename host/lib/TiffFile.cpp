@@ -63,13 +63,11 @@ const char* photometricName(uint16_t p) {
 
 // Copies one decoded row segment (file byte order already native) into the image.
 void storeSamples(Image& image, const unsigned char* src, int x0, int y, int count) {
-    const int spp = image.channels;
-    std::uint16_t* dst = &image.samples[image.index(x0, y)];
-    const std::size_t n = std::size_t(count) * spp;
+    const std::size_t at = image.index(x0, y), n = std::size_t(count) * std::size_t(image.channels);
     if (image.depth == 16)
-        std::memcpy(dst, src, n * 2);
+        std::memcpy(&image.samples16[at], src, n * 2);
     else
-        for (std::size_t i = 0; i < n; ++i) dst[i] = src[i];
+        std::memcpy(&image.samples8[at], src, n);
 }
 
 }  // namespace
@@ -168,11 +166,11 @@ void writeTiff(int fd, const std::string& name, const Image& image) {
     const std::size_t n = std::size_t(image.width) * spp;
     std::vector<unsigned char> line(n * (image.depth / 8));
     for (int y = 0; y < image.height; ++y) {
-        const std::uint16_t* src = &image.samples[image.index(0, y)];
+        const std::size_t at = image.index(0, y);
         if (image.depth == 16)
-            std::memcpy(line.data(), src, n * 2);
+            std::memcpy(line.data(), &image.samples16[at], n * 2);
         else
-            for (std::size_t i = 0; i < n; ++i) line[i] = (unsigned char)(src[i] > 255 ? 255 : src[i]);
+            std::memcpy(line.data(), &image.samples8[at], n);
         if (TIFFWriteScanline(t, line.data(), uint32_t(y), 0) < 0)
             throw HostError(name, "cannot write TIFF: " + lastError("write failed"));
     }

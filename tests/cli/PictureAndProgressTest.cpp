@@ -28,8 +28,10 @@ TEST(ComparePicture, SideBySideHoldsBothImagesAndTheirLabels) {
         // A flat mid-grey keeps the labels the only black and white in the picture.
         Image before(200, 120, 4, depth), after(200, 120, 4, depth);
         const std::uint16_t grey = depth == 16 ? 16384 : 128, other = depth == 16 ? 8192 : 64;
-        std::fill(before.samples.begin(), before.samples.end(), grey);
-        std::fill(after.samples.begin(), after.samples.end(), other);
+        for (std::size_t i = 0; i < before.sampleCount(); ++i) {
+            before.setSample(i, grey);
+            after.setSample(i, other);
+        }
         const Image picture = comparePicture(before, after, std::nullopt, CompareLayout::SideBySide);
         const int gap = picture.width - 400;
         ASSERT_GE(gap, 2);
@@ -79,7 +81,7 @@ TEST(ComparePicture, LabelsClipAtTheEdgesOfTinyPictures) {
         EXPECT_EQ(picture.width, size);
     }
     Image canvas(10, 10, 3, 8);
-    std::fill(canvas.samples.begin(), canvas.samples.end(), 100);
+    std::fill(canvas.samples8.begin(), canvas.samples8.end(), 100);
     drawLabel(canvas, -80, -5, "after", 2);  // wholly outside
     drawLabel(canvas, 8, 8, "before", 3);
     EXPECT_EQ(canvas.at(9, 9, 0), 0) << "the box reaches into the corner";

@@ -64,8 +64,8 @@ TEST_P(EndToEnd, RunSucceedsKeepsTheFileShapeAndTouchesOnlyTheSelection) {
     ASSERT_EQ(written.image.channels, c.channels);
 
     // Compare what is in the files: outside the selection, and alpha everywhere, byte for byte.
-    const auto& before = c.depth == 16 ? source.original16 : source.image.samples;
-    const auto& after = c.depth == 16 ? written.original16 : written.image.samples;
+    const auto before = c.depth == 16 ? source.original16 : source.image.widened();
+    const auto after = c.depth == 16 ? written.original16 : written.image.widened();
     const Selection s = c.selection.value_or(Selection{0, 0, c.width, c.height});
     long changedInside = 0;
     for (int y = 0; y < c.height; ++y)

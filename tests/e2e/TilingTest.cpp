@@ -40,10 +40,8 @@ Image wholeImageAsOneTile(const Image& in, const std::string& text) {
     const uint16_t mode = in.depth == 16 ? KERNEL::kModeRGB16 : KERNEL::kModeRGB;
     const uint32_t rowBytes = uint32_t(in.width * in.channels) * bytes;
     std::vector<uint8_t> src(size_t(rowBytes) * size_t(in.height)), dst;
-    for (size_t i = 0; i < in.samples.size(); ++i) {
-        if (bytes == 1) src[i] = uint8_t(in.samples[i]);
-        else std::memcpy(&src[2 * i], &in.samples[i], 2);
-    }
+    if (bytes == 1) src = in.samples8;
+    else std::memcpy(src.data(), in.samples16.data(), src.size());
     dst = src;
     std::unique_ptr<KERNEL::cPixelBlock> source(KERNEL::cPixelBlock::create(
         src.data(), in.width, in.height, bytes, uint32_t(in.channels) * bytes, 0, 1, mode, rowBytes, 0, 0));
@@ -53,10 +51,8 @@ Image wholeImageAsOneTile(const Image& in, const std::string& text) {
     action.reset();
     EXPECT_EQ(memory.liveBuffers(), 0u);
     Image out = in;
-    for (size_t i = 0; i < out.samples.size(); ++i) {
-        if (bytes == 1) out.samples[i] = dst[i];
-        else std::memcpy(&out.samples[i], &dst[2 * i], 2);
-    }
+    if (bytes == 1) out.samples8 = dst;
+    else std::memcpy(out.samples16.data(), dst.data(), dst.size());
     return out;
 }
 
@@ -82,7 +78,7 @@ TEST_P(Seams, TiledRunEqualsOneTileOverTheWholeImage) {
         ASSERT_TRUE(r.ok()) << r.message();
         EXPECT_EQ(r.tilesServed, 9) << "three rows of three tiles";
         size_t differing = 0;
-        for (size_t i = 0; i < whole.samples.size(); ++i) differing += whole.samples[i] != tiled.samples[i];
+        for (size_t i = 0; i < whole.sampleCount(); ++i) differing += whole.sample(i) != tiled.sample(i);
         EXPECT_EQ(differing, 0u) << depth << "-bit";
         EXPECT_NE(tiled, input) << "the stages must have changed the image for the comparison to mean anything";
     }

@@ -51,7 +51,7 @@ host::Image noisyImage(int w, int h, int channels, int depth, unsigned seed) {
             for (int c = 0; c < channels; ++c) {
                 const int base = c == 3 ? (x * 7 + y * 3) % (max + 1) : (max * ((x + c * 40) % w)) / w;
                 const int noise = c == 3 ? 0 : int(next() % std::uint32_t(max / 5 + 1)) - max / 10;
-                image.at(x, y, c) = std::uint16_t(std::clamp(base + noise, 0, max));
+                image.set(x, y, c, std::uint16_t(std::clamp(base + noise, 0, max)));
             }
     return image;
 }
@@ -66,7 +66,7 @@ struct FilePixels {
 FilePixels loadPixels(const fs::path& path) {
     host::LoadedImage loaded = host::loadImage(path);
     FilePixels p{loaded.image.width, loaded.image.height, loaded.image.channels, loaded.image.depth, {}};
-    p.samples = loaded.image.depth == 16 ? loaded.original16 : loaded.image.samples;
+    p.samples = loaded.image.depth == 16 ? loaded.original16 : loaded.image.widened();
     return p;
 }
 

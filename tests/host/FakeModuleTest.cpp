@@ -26,7 +26,7 @@ Image inverted(const Image& image, std::optional<Selection> selection = std::nul
     const Selection s = selection.value_or(Selection{0, 0, image.width, image.height});
     for (int y = s.y; y < s.y + s.height; ++y)
         for (int x = s.x; x < s.x + s.width; ++x)
-            for (int p = 0; p < 3; ++p) out.at(x, y, p) = std::uint16_t(image.maxValue() - image.at(x, y, p));
+            for (int p = 0; p < 3; ++p) out.set(x, y, p, std::uint16_t(image.maxValue() - image.at(x, y, p)));
     return out;
 }
 

@@ -30,7 +30,7 @@ TEST_P(FileRoundTrip, KeepsSizeDepthAlphaAndSamples) {
     const LoadedImage loaded = loadImage(file);
     EXPECT_EQ(loaded.format, c.format);
     EXPECT_EQ(loaded.image, image);
-    EXPECT_EQ(loaded.original16.size(), c.depth == 16 ? image.samples.size() : 0u);
+    EXPECT_EQ(loaded.original16.size(), c.depth == 16 ? image.sampleCount() : 0u);
     EXPECT_EQ(hosttest::filesIn(folder), 1) << "no temporary file is left behind";
 }
 
@@ -56,27 +56,27 @@ TEST(Mapping16, UnchangedSamplesKeepTheirOriginalFileValue) {
     for (const FileFormat format : {FileFormat::Png, FileFormat::Tiff}) {
         const fs::path folder = hosttest::scratchFolder(format == FileFormat::Png ? "png" : "tif");
         Image file(256, 256, 3, 16);  // 196608 samples: every value three times
-        for (std::size_t i = 0; i < file.samples.size(); ++i) file.samples[i] = std::uint16_t(i);
+        for (std::size_t i = 0; i < file.samples16.size(); ++i) file.samples16[i] = std::uint16_t(i);
         // The source carries every value as its original, so the file gets them verbatim.
         LoadedImage source;
         source.image = file;
-        source.original16 = file.samples;
-        for (auto& s : source.image.samples) s = hostFromFile16(s);
+        source.original16 = file.samples16;
+        for (auto& s : source.image.samples16) s = hostFromFile16(s);
         const fs::path in = folder / (format == FileFormat::Png ? "in.png" : "in.tif");
         saveImage(in, source.image, format, &source);
         LoadedImage loaded = loadImage(in);
-        ASSERT_EQ(loaded.original16, file.samples) << "the file holds every 16-bit value as written";
+        ASSERT_EQ(loaded.original16, file.samples16) << "the file holds every 16-bit value as written";
 
         Image processed = loaded.image;
-        for (std::size_t i = 0; i < processed.samples.size(); i += 3)
-            processed.samples[i] = std::uint16_t(32768 - processed.samples[i]);  // red changes, green and blue stay
+        for (std::size_t i = 0; i < processed.samples16.size(); i += 3)
+            processed.samples16[i] = std::uint16_t(32768 - processed.samples16[i]);  // red changes, green and blue stay
         const fs::path out = folder / (format == FileFormat::Png ? "out.png" : "out.tif");
         saveImage(out, processed, format, &loaded);
         const LoadedImage result = loadImage(out);
-        for (std::size_t i = 0; i < file.samples.size(); ++i) {
+        for (std::size_t i = 0; i < file.samples16.size(); ++i) {
             // A change that lands on the loaded value is no change.
-            const bool changed = processed.samples[i] != loaded.image.samples[i];
-            const std::uint16_t expected = changed ? fileFromHost16(processed.samples[i]) : file.samples[i];
+            const bool changed = processed.samples16[i] != loaded.image.samples16[i];
+            const std::uint16_t expected = changed ? fileFromHost16(processed.samples16[i]) : file.samples16[i];
             ASSERT_EQ(result.original16[i], expected) << "sample " << i;
         }
     }
@@ -173,7 +173,7 @@ TEST(ImageFileErrors, FailedWritesLeaveNoFile) {
     const Image image = hosttest::patternImage(4, 4, 3, 8);
     EXPECT_THROW(saveImage(folder / "no" / "such" / "folder.png", image, FileFormat::Png), HostError);
     Image broken = image;
-    broken.samples.resize(5);
+    broken.samples8.resize(5);
     EXPECT_THROW(saveImage(folder / "broken.png", broken, FileFormat::Png), HostError);
     Image gray(4, 4, 1, 8);
     EXPECT_THROW(saveImage(folder / "gray.tif", gray, FileFormat::Tiff), HostError);

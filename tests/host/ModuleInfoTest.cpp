@@ -214,7 +214,7 @@ TEST(ModuleInfo, RealModuleLoadsByItsPiplAndRefusesGray) {
     EXPECT_FALSE(checkImageSupported(*module.info(), pi::plugInModeRGB48, 16));
 
     Image image(9, 7, 3, 16);
-    for (std::size_t i = 0; i < image.samples.size(); ++i) image.samples[i] = std::uint16_t(i * 97 % kHost16Max);
+    for (std::size_t i = 0; i < image.samples16.size(); ++i) image.samples16[i] = std::uint16_t(i * 97 % kHost16Max);
     RunOptions options;
     options.parentWindow = false;
     const RunResult r = runFilter(module, image, options);

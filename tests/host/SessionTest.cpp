@@ -206,11 +206,16 @@ TEST(Session, ResultCodesEndTheRunTheWayHostsDo) {
     for (const Case c : {Case{pi::filterSelectorPrepare, false}, Case{pi::filterSelectorStart, true},
                          Case{pi::filterSelectorContinue, true}}) {
         Image image = hosttest::patternImage(3, 3, 3, 8);
+        const Image original = image;
         Calls calls;
         script() = [&](pi::int16 sel, pi::FilterRecord* r, intptr_t*, pi::int16* result) {
             calls.selectors.push_back(sel);
             if (sel == pi::filterSelectorStart) r->outRect = rect(0, 0, 3, 3), r->outHiPlane = 2;
-            if (sel == pi::filterSelectorContinue) r->outRect = rect(0, 0, 0, 0);
+            if (sel == pi::filterSelectorContinue) {
+                // The output tile points into the image: what a failing call wrote must not stay.
+                if (r->outData) std::memset(r->outData, 0xAB, 3);
+                r->outRect = rect(0, 0, 0, 0);
+            }
             if (sel == c.failing) *result = pi::memFullErr;
             if (sel == pi::filterSelectorFinish) *result = pi::paramErr;  // a later error is not the one reported
         };
@@ -218,6 +223,7 @@ TEST(Session, ResultCodesEndTheRunTheWayHostsDo) {
         EXPECT_EQ(result.result, pi::memFullErr) << c.failing;
         EXPECT_EQ(calls.count(pi::filterSelectorFinish), c.finishExpected ? 1 : 0) << c.failing;
         EXPECT_NE(result.message().find("-108 (out of memory)"), std::string::npos) << result.message();
+        EXPECT_EQ(image, original) << c.failing;
     }
 }
 
@@ -297,7 +303,7 @@ TEST(Session, AdvanceStateServesAndCommitsInsideStart) {
     ASSERT_TRUE(result.ok()) << result.message();
     EXPECT_EQ(result.advanceStateCalls, 6);
     EXPECT_EQ(result.continueCalls, 0);
-    for (std::size_t i = 0; i < image.samples.size(); ++i) EXPECT_EQ(image.samples[i], 255 - original.samples[i]);
+    for (std::size_t i = 0; i < image.sampleCount(); ++i) EXPECT_EQ(image.sample(i), 255 - original.sample(i));
 }
 
 TEST(Session, ProgressIsRecordedAndForwarded) {

@@ -28,7 +28,7 @@ inline noctiva::host::Image patternImage(int w, int h, int channels, int depth, 
     noctiva::host::Image image(w, h, channels, depth);
     std::mt19937 random(seed);
     const unsigned range = depth == 16 ? 32769u : 256u;
-    for (auto& s : image.samples) s = std::uint16_t(random() % range);
+    for (std::size_t i = 0; i < image.sampleCount(); ++i) image.setSample(i, std::uint16_t(random() % range));
     return image;
 }
 

@@ -35,7 +35,7 @@ Image testImage(int w, int h, int channels, int depth, unsigned seed) {
                 const int noise = int(random() % 64) - 32;
                 v = std::clamp(v + noise * (depth == 16 ? 128 : 1), 0, maxv);
                 if (random() % 97 == 0) v = random() % 2 ? maxv : 0;  // impulses, extremes
-                image.at(x, y, c) = std::uint16_t(v);
+                image.set(x, y, c, std::uint16_t(v));
             }
     return image;
 }

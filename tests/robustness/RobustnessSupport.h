@@ -19,7 +19,7 @@ inline noctiva::host::Image sampleCrop(int width, int height) {
     noctiva::host::Image crop(width, height, whole.channels, whole.depth);
     for (int y = 0; y < height; ++y)
         for (int x = 0; x < width; ++x)
-            for (int c = 0; c < whole.channels; ++c) crop.at(x, y, c) = whole.at(x, y, c);
+            for (int c = 0; c < whole.channels; ++c) crop.set(x, y, c, whole.at(x, y, c));
     return crop;
 }
 

@@ -41,7 +41,7 @@ TEST(PamFile, RoundTripsEveryLayoutItWrites) {
 TEST(PamFile, WritesTheStandardHeaderAndBigEndianSamples) {
     const fs::path folder = hosttest::scratchFolder("pam-bytes");
     Image image(2, 1, 3, 16);
-    image.samples = {1, 1, 32768, 16384, 100, 200};  // host scale
+    image.samples16 = {1, 1, 32768, 16384, 100, 200};  // host scale
     LoadedImage source;
     source.image = image;
     source.original16 = {1, 3, 65535, 32768, 200, 400};  // unchanged samples keep these (1, not 2)
@@ -58,7 +58,7 @@ TEST(PamFile, ReadsCommentsAndAnyFieldOrder) {
     const LoadedImage loaded = loadImage(folder / "c.pam");
     EXPECT_EQ(loaded.image.channels, 4);
     EXPECT_EQ(loaded.image.depth, 8);
-    EXPECT_EQ(loaded.image.samples, (std::vector<std::uint16_t>{1, 2, 3, 4}));
+    EXPECT_EQ(loaded.image.samples8, (std::vector<std::uint8_t>{1, 2, 3, 4}));
 }
 
 TEST(PamFile, RefusesWhatItCannotRepresent) {

@@ -32,7 +32,7 @@ const Fault kFaults[] = {
 Image patternImage() {
     Image image(260, 230, 4, 16);
     std::mt19937 random(7);
-    for (auto& s : image.samples) s = std::uint16_t(random() % 32769u);
+    for (auto& s : image.samples16) s = std::uint16_t(random() % 32769u);
     return image;
 }
 
