@@ -10,17 +10,15 @@
 #include <string>
 #include <vector>
 
-#include "noctiva/host/Module.h"
+#include "lib/TestFiles.h"
 #include "noctiva/host/Session.h"
+#include "support/NoctivaModule.h"
 
 using namespace noctiva::host;
 
 namespace {
 
-const Module& noctivaModule() {
-    static const Module module(NOCTIVA_MODULE_PATH);
-    return module;
-}
+using testsupport::noctivaModule;
 
 // Smooth ramps, a hard-edged block and noise, so that blur, clamping and edges all show.
 Image testImage(int w, int h, int channels, int depth, unsigned seed) {
@@ -40,30 +38,9 @@ Image testImage(int w, int h, int channels, int depth, unsigned seed) {
     return image;
 }
 
-class cEnv {
-public:
-    cEnv(const char* name, std::optional<std::string> value) : name(name) {
-        if (const char* old = std::getenv(name)) previous = old;
-        if (value)
-            setenv(name, value->c_str(), 1);
-        else
-            unsetenv(name);
-    }
-    ~cEnv() {
-        if (previous)
-            setenv(name, previous->c_str(), 1);
-        else
-            unsetenv(name);
-    }
-
-private:
-    const char* name;
-    std::optional<std::string> previous;
-};
-
 Image run(const Image& input, const RunOptions& options, bool reference, const std::string& threads) {
-    cEnv ref("NOCTIVA_REFERENCE", reference ? std::optional<std::string>("1") : std::nullopt);
-    cEnv thr("NOCTIVA_THREADS", threads);
+    vek::testing::ScopedEnv ref("NOCTIVA_REFERENCE", reference ? "1" : nullptr);
+    vek::testing::ScopedEnv thr("NOCTIVA_THREADS", threads.c_str());
     Image image = input;
     const RunResult r = runFilter(noctivaModule().entry(), image, options);
     EXPECT_TRUE(r.ok()) << r.message();
