@@ -170,25 +170,13 @@ ModuleInfo parse(const Bytes& p, const std::optional<Bytes>& a = std::nullopt) {
 }  // namespace
 
 #ifdef NOCTIVA_MODULE_PATH
-// The PIPL's bytes are compared in tests/plugin; here is what the host makes of them and of the AETE.
-TEST(ModuleInfo, RealModuleDeclaresHiddenRgbFilterWithOneTextParameter) {
-    const ModuleInfo info = readModuleInfo(NOCTIVA_MODULE_PATH);
-    EXPECT_EQ(info.name, "Noctiva...");
-    EXPECT_TRUE(info.hidden());
-    EXPECT_EQ(info.entryPoint, "ENTRYPOINT");
-    EXPECT_TRUE(info.supportsFilterLayers());
-    ASSERT_TRUE(info.terminology);
-    EXPECT_EQ(info.terminology->terminologyId, 16013);
-    // The flags name 8-bit RGB only; the expression adds 16-bit RGB.
-    EXPECT_TRUE(info.modeFlagged(pi::plugInModeRGBColor));
-    EXPECT_FALSE(info.modeFlagged(pi::plugInModeRGB48));
-    EXPECT_TRUE(info.supportsMode(pi::plugInModeRGBColor, 8));
-    EXPECT_TRUE(info.supportsMode(pi::plugInModeRGB48, 16));
-    for (pi::int16 refused : {pi::plugInModeGrayScale, pi::plugInModeGray16, pi::plugInModeCMYKColor,
-                              pi::plugInModeLabColor, pi::plugInModeLab48, pi::plugInModeBitmap})
-        EXPECT_FALSE(info.supportsMode(refused, naturalDepth(refused))) << refused;
-    EXPECT_EQ(info.supportedModesText(), "RGB 8-bit, RGB 16-bit");
-
+// The PIPL's bytes are pinned in tests/plugin and the parser's reading of every field is checked
+// below on built resources; what only the real module shows is its AETE and its refusal message.
+TEST(ModuleInfo, RealModuleDeclaresOneTextParameterAndRefusesGray) {
+    const Module module = Module::load(NOCTIVA_MODULE_PATH);
+    ASSERT_NE(module.info(), nullptr);
+    EXPECT_NE(module.entry(), nullptr);
+    const ModuleInfo& info = *module.info();
     ASSERT_TRUE(info.event);
     EXPECT_EQ(info.event->name, "Noctiva");
     EXPECT_EQ(info.event->eventClass, pi::fourCC("qv06"));
@@ -201,24 +189,12 @@ TEST(ModuleInfo, RealModuleDeclaresHiddenRgbFilterWithOneTextParameter) {
     EXPECT_EQ(info.event->parameters[0].key, pi::keyPar1);
     EXPECT_EQ(info.event->parameters[0].type, pi::typeText);
     EXPECT_EQ(info.event->parameters[0].flags, 0);
-}
 
-TEST(ModuleInfo, RealModuleLoadsByItsPiplAndRefusesGray) {
-    const Module module = Module::load(NOCTIVA_MODULE_PATH);
-    ASSERT_NE(module.info(), nullptr);
-    EXPECT_NE(module.entry(), nullptr);
-    const auto refusal = checkImageSupported(*module.info(), pi::plugInModeGrayScale, 8);
+    const auto refusal = checkImageSupported(info, pi::plugInModeGrayScale, 8);
     ASSERT_TRUE(refusal);
     EXPECT_STREQ(refusal->what(),
                  "Noctiva...: this filter does not support Gray 8-bit images (it supports RGB 8-bit, RGB 16-bit)");
-    EXPECT_FALSE(checkImageSupported(*module.info(), pi::plugInModeRGB48, 16));
-
-    Image image(9, 7, 3, 16);
-    for (std::size_t i = 0; i < image.samples16.size(); ++i) image.samples16[i] = std::uint16_t(i * 97 % kHost16Max);
-    RunOptions options;
-    options.parentWindow = false;
-    const RunResult r = runFilter(module, image, options);
-    EXPECT_TRUE(r.ok()) << r.message();
+    EXPECT_FALSE(checkImageSupported(info, pi::plugInModeRGB48, 16));
 }
 #endif
 
