@@ -65,15 +65,6 @@ INSTANTIATE_TEST_SUITE_P(
                       TilingCase{20, 11, 4, 16, "tile=3 margin=1 advance=1", Selection{1, 1, 18, 9}},
                       TilingCase{12, 12, 3, 8, "tile=5 margin=1 buffer=64", {}}));
 
-TEST(FakeModule, Par1AndDResReachTheModuleAndPar1ComesBack) {
-    Image image = hosttest::patternImage(4, 4, 3, 8);
-    RunOptions options;
-    options.dRes = 3;
-    const RunResult result = runFake(image, "op=copy hello", options);
-    ASSERT_TRUE(result.ok()) << result.message();
-    EXPECT_EQ(result.par1Out, "tiles=1 moves=0 dres=3 colors=0 got=op=copy hello");
-}
-
 TEST(FakeModule, ModuleErrorCodesAreReportedWithTheirMeaning) {
     Image image = hosttest::patternImage(4, 4, 3, 8);
     const RunResult result = runFake(image, "fail=-30100");

@@ -104,17 +104,6 @@ INSTANTIATE_TEST_SUITE_P(Host, Padding,
                                            PaddingCase{8, -2}, PaddingCase{16, 255}, PaddingCase{16, 7},
                                            PaddingCase{16, -1}, PaddingCase{16, -2}));
 
-TEST(Session, ErrorOnBoundsRefusesAnAreaOutsideTheImageAndStillFinishes) {
-    Image image = hosttest::patternImage(4, 4, 3, 8);
-    Calls calls;
-    const RunResult result =
-        serveOnce(image, rect(0, 0, 4, 5), rect(0, 0, 0, 0), -3, -3, [](pi::FilterRecord*) {}, &calls);
-    EXPECT_FALSE(result.ok());
-    EXPECT_NE(result.hostError.find("leaves the image"), std::string::npos) << result.hostError;
-    EXPECT_EQ(calls.count(pi::filterSelectorContinue), 0);
-    EXPECT_EQ(calls.count(pi::filterSelectorFinish), 1);
-}
-
 TEST(Session, OutputStartsAsTheDestinationAndOnlyRequestedPlanesGoBack) {
     Image image = hosttest::patternImage(6, 5, 4, 8);
     const Image original = image;
@@ -243,6 +232,7 @@ TEST(Session, AModuleThatNeverFinishesIsStopped) {
     EXPECT_EQ(calls.count(pi::filterSelectorFinish), 1);
 }
 
+// Refused at Start: no tile is served, and Finish is still called.
 TEST(Session, RequestsTheHostCannotServeAreRefused) {
     struct Case {
         const char* what;
@@ -256,10 +246,14 @@ TEST(Session, RequestsTheHostCannotServeAreRefused) {
         {"bad padding", [](pi::FilterRecord* r) { r->inputPadding = 256; }, "padding"},
         {"huge area", [](pi::FilterRecord* r) { r->inRect = rect(-32768, -32768, 32767, 32767), r->inputPadding = 0; },
          "too large"},
+        {"outside, error on bounds", [](pi::FilterRecord* r) { r->inRect = rect(0, 0, 3, 4), r->inputPadding = -3; },
+         "leaves the image"},
     };
     for (const Case& c : cases) {
         Image image = hosttest::patternImage(3, 3, 3, 8);
+        Calls calls;
         script() = [&](pi::int16 sel, pi::FilterRecord* r, intptr_t*, pi::int16*) {
+            calls.selectors.push_back(sel);
             if (sel != pi::filterSelectorStart) return;
             r->inRect = rect(0, 0, 3, 3);
             r->inHiPlane = 2;
@@ -268,6 +262,8 @@ TEST(Session, RequestsTheHostCannotServeAreRefused) {
         const RunResult result = runFilter(scriptedEntry, image);
         EXPECT_FALSE(result.ok()) << c.what;
         EXPECT_NE(result.hostError.find(c.message), std::string::npos) << c.what << ": " << result.hostError;
+        EXPECT_EQ(calls.count(pi::filterSelectorContinue), 0) << c.what;
+        EXPECT_EQ(calls.count(pi::filterSelectorFinish), 1) << c.what;
     }
     // Full resolution as modules publish it: 0, the raw 1, or 1.0.
     for (pi::Fixed rate : {0, 1, 1 << 16}) {
