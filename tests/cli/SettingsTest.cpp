@@ -107,6 +107,17 @@ TEST(Assignment, AcceptsNamesAndIntegersAndRefusesTheRest) {
     }
 }
 
+// `f` must throw a UsageError whose message holds `reason`.
+template <class F>
+void expectUsageError(F&& f, const std::string& reason) {
+    try {
+        f();
+        ADD_FAILURE() << "accepted, expected: " << reason;
+    } catch (const UsageError& e) {
+        EXPECT_NE(std::string(e.what()).find(reason), std::string::npos) << e.what();
+    }
+}
+
 ParameterValues valuesOf(const std::optional<std::string>& text) {
     ParameterValues values{};
     values.fill(-777);  // so an entry missing from the text shows
@@ -150,7 +161,7 @@ TEST(Composition, PresetOrTextIsTheBaseAndEverySetFollowsInOrder) {
     expected[indexOf("step1.edgeStrength")] = 60;
     EXPECT_EQ(valuesOf(settingsFromOptions(o)), expected);
 
-    // A partial text is read as the module would read it, prefix matches and all.
+    // A partial text is read over the defaults, as the module would read it.
     o.par1 = "vek  Parameter57 9 ";
     expected = defaultParameterValues();
     expected[5] = 7;  // "Parameter5" matched inside "Parameter57"; step1.mode keeps its default
@@ -159,13 +170,8 @@ TEST(Composition, PresetOrTextIsTheBaseAndEverySetFollowsInOrder) {
 }
 
 TEST(Composition, RefusesWhatCannotBeCombined) {
-    const auto refused = [](CommandOptions o, const std::string& reason) {
-        try {
-            settingsFromOptions(o);
-            ADD_FAILURE() << "accepted, expected: " << reason;
-        } catch (const UsageError& e) {
-            EXPECT_NE(std::string(e.what()).find(reason), std::string::npos) << e.what();
-        }
+    const auto refused = [](const CommandOptions& o, const std::string& reason) {
+        expectUsageError([&] { settingsFromOptions(o); }, reason);
     };
     CommandOptions o;
     o.preset = "default";
@@ -239,12 +245,7 @@ TEST_F(Planning, MapsInputsToOutputsAndRefusesOverwritesAndCollisions) {
     EXPECT_EQ(planJobs(o).size(), 2u);
 
     const auto refused = [](const CommandOptions& o, const std::string& reason) {
-        try {
-            planJobs(o);
-            ADD_FAILURE() << "accepted, expected: " << reason;
-        } catch (const UsageError& e) {
-            EXPECT_NE(std::string(e.what()).find(reason), std::string::npos) << e.what();
-        }
+        expectUsageError([&] { planJobs(o); }, reason);
     };
     o.output = p("out/single.png");
     refused(o, "several inputs need -o to name an existing folder");
