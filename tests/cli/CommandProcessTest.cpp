@@ -121,7 +121,7 @@ TEST(Command, SettingsFromPresetAndSetReachTheModuleExactly) {
     REQUIRE_REAL_MODULE();
     const fs::path folder = hosttest::scratchFolder("set");
     saveImage(folder / "in.tif", hosttest::patternImage(30, 20, 3, 8), FileFormat::Tiff);
-    clitest::Outcome o = run(q(folder / "in.tif") + " -o " + q(folder / "out.tif") +
+    const clitest::Outcome o = run(q(folder / "in.tif") + " -o " + q(folder / "out.tif") +
                              " --preset wavelet --set step2.preset9=2 --set Parameter57=4 --set step2.preset9=3" +
                              " --save-par1 " + q(folder / "par1.txt") + moduleArgument());
     ASSERT_EQ(o.status, 0) << o.err;
@@ -132,21 +132,6 @@ TEST(Command, SettingsFromPresetAndSetReachTheModuleExactly) {
     EXPECT_EQ(clitest::readFile(folder / "par1.txt"), noctiva::cli::writeSettingsText(expected))
         << "the module read every entry we built and wrote them back";
 
-    // With every step bypassed only the round trip through the kernel's Lab remains: within one level.
-    o = run(q(folder / "in.tif") + " -o " + q(folder / "same.tif") + " --set step2.mode=0" + moduleArgument());
-    ASSERT_EQ(o.status, 0) << o.err;
-    const Image same = loadImage(folder / "same.tif").image, in = loadImage(folder / "in.tif").image;
-    int largest = 0;
-    for (std::size_t i = 0; i < in.sampleCount(); ++i)
-        largest = std::max(largest, std::abs(int(same.sample(i)) - int(in.sample(i))));
-    EXPECT_LE(largest, 1);
-    o = run(q(folder / "in.tif") + " -o " + q(folder / "blurred.tif") + moduleArgument());
-    ASSERT_EQ(o.status, 0) << o.err;
-    const Image blurred = loadImage(folder / "blurred.tif").image;
-    largest = 0;
-    for (std::size_t i = 0; i < in.sampleCount(); ++i)
-        largest = std::max(largest, std::abs(int(blurred.sample(i)) - int(in.sample(i))));
-    EXPECT_GT(largest, 10) << "so the --set above is what kept the image";
 }
 
 TEST(Command, BatchGoesOnPastABrokenFileAndFailsAtTheEnd) {
@@ -155,7 +140,7 @@ TEST(Command, BatchGoesOnPastABrokenFileAndFailsAtTheEnd) {
     saveImage(folder / "a.png", hosttest::patternImage(20, 12, 3, 8, 1), FileFormat::Png);
     std::ofstream(folder / "broken.png") << "\x89PNG but not really";
     saveImage(folder / "c.tif", hosttest::patternImage(9, 14, 4, 16, 2), FileFormat::Tiff);
-    clitest::Outcome o = run(q(folder / "a.png") + " " + q(folder / "broken.png") + " " + q(folder / "c.tif") +
+    const clitest::Outcome o = run(q(folder / "a.png") + " " + q(folder / "broken.png") + " " + q(folder / "c.tif") +
                              " -o " + q(folder / "out") + moduleArgument());
     EXPECT_EQ(o.status, 1);
     EXPECT_EQ(lines(o.err), 1u) << o.err;
@@ -163,13 +148,6 @@ TEST(Command, BatchGoesOnPastABrokenFileAndFailsAtTheEnd) {
     EXPECT_NE(o.out.find("2 of 3 files processed, 1 failed"), std::string::npos) << o.out;
     EXPECT_EQ(loadImage(folder / "out" / "a.png").image.width, 20);
     EXPECT_EQ(loadImage(folder / "out" / "c.tif").image.channels, 4);
-    EXPECT_EQ(hosttest::filesIn(folder / "out"), 2);
-
-    fs::remove_all(folder / "out");
-    fs::create_directories(folder / "out");
-    o = run(q(folder / "a.png") + " " + q(folder / "c.tif") + " -o " + q(folder / "out") + " -q" + moduleArgument());
-    EXPECT_EQ(o.status, 0) << o.err;
-    EXPECT_EQ(o.out, "");
     EXPECT_EQ(hosttest::filesIn(folder / "out"), 2);
 }
 
