@@ -2,8 +2,6 @@
 // cursor walk.
 #include <gtest/gtest.h>
 
-#include <memory>
-
 #include "graph/GraphTestSupport.h"
 #include "kernel/Lab.h"
 
@@ -88,22 +86,29 @@ void referenceWalk(KERNEL::cPixelBlock* src, KERNEL::cPixelBlock* dst, bool forw
     }
 }
 
-TEST(Lab, RectanglesPastTheStoredEdgeMatchTheCursorWalk) {
+TEST(Lab, RectanglesPastTheStoredEdgeAndSamplingTwoMatchTheCursorWalk) {
     // Inner rectangles inside, equal to, and widened past the stored one (as node borders do), and
-    // an empty one that must leave the block untouched.
-    const cRect inners[] = {{3, 9, 2, 7}, {0, 12, 0, 10}, {-4, 16, -3, 13}, {5, 5, 0, 10}, {0, 1, 0, 1}};
+    // an empty one that must leave the block untouched; at sampling 2 the 12 x 10 stored pixels stand
+    // for 24 x 20 image pixels, each visited once.
+    struct Case {
+        int32_t sampling;
+        cRect inner;
+    };
+    const Case cases[] = {{1, {3, 9, 2, 7}},   {1, {0, 12, 0, 10}}, {1, {-4, 16, -3, 13}}, {1, {5, 5, 0, 10}},
+                          {1, {0, 1, 0, 1}},   {2, {0, 24, 0, 20}}, {2, {-4, 30, -2, 24}}};
     for (bool forward : {true, false}) {
-        for (const cRect& inner : inners) {
-            SCOPED_TRACE(testing::Message() << forward << " " << inner.x0 << "," << inner.x1);
-            Image in(12, 10);
+        for (const Case& c : cases) {
+            const cRect& inner = c.inner;
+            SCOPED_TRACE(testing::Message() << forward << " sampling " << c.sampling << " " << inner.x0 << "," << inner.x1);
+            const int32_t w = 12 * c.sampling, h = 10 * c.sampling;
+            Image in(w, h, 0, 0, c.sampling);
             in.fillRandom(3, forward ? 0 : -70000, forward ? 65535 : 140000);
-            Image fast(12, 10), slow(12, 10);
+            Image fast(w, h, 0, 0, c.sampling), slow(w, h, 0, 0, c.sampling);
             fast.fillRandom(4);
             slow.samples = fast.samples;
-            const cRect outer{0, 12, 0, 10};
-            auto src = in.block(outer, inner);
-            auto a = fast.block(outer, inner);
-            auto b = slow.block(outer, inner);
+            auto src = in.block(inner);
+            auto a = fast.block(inner);
+            auto b = slow.block(inner);
             if (forward)
                 cRGB2LAB().Process(src.get(), a.get());
             else
@@ -112,26 +117,6 @@ TEST(Lab, RectanglesPastTheStoredEdgeMatchTheCursorWalk) {
             EXPECT_EQ(fast.samples, slow.samples);
         }
     }
-}
-
-TEST(Lab, SamplingTwoVisitsEveryStoredPixelOnce) {
-    // Stored grid 5 x 4 standing for 10 x 8 image pixels.
-    Image in(5, 4), out(5, 4);
-    in.fillRandom(9);
-    const cRect r{0, 10, 0, 8};
-    auto mk = [](Image& im, const cRect& rr) {
-        return new KERNEL::cRGB32PixelBlock(reinterpret_cast<uint8_t*>(im.samples.data()), rr, rr, 4, 12, 2,
-                                            KERNEL::kModeRGB32, im.rowBytes());
-    };
-    std::unique_ptr<KERNEL::cPixelBlock> src(mk(in, r)), dst(mk(out, r));
-    cRGB2LAB().Process(src.get(), dst.get());
-    for (int32_t y = 0; y < 4; ++y)
-        for (int32_t x = 0; x < 5; ++x) {
-            const int32_t* p = in.at(x, y);
-            int32_t e[3];
-            KERNEL::lab::toLab(p[0], p[1], p[2], e[0], e[1], e[2]);
-            for (int k = 0; k < 3; ++k) ASSERT_EQ(out.at(x, y)[k], e[k]) << x << "," << y;
-        }
 }
 
 }  // namespace
