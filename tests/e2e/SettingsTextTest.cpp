@@ -63,13 +63,11 @@ TEST(SettingsText, WhatIsReadBackDecidesTheRun) {
 }
 
 TEST(SettingsText, EveryEntryRoundTripsIncludingNegativeValues) {
-    std::string text = "vek ";
-    for (const auto& p : shadowParameterTable()) {
-        // Bypass every step so the run stays fast; other values are written and read back exactly.
-        const bool mode = std::string_view(p.name).ends_with(".mode");
-        const int value = mode ? 0 : (int(p.number) % 2 ? -3 - int(p.number) : 1000 + int(p.number));
-        text += " Parameter" + std::to_string(p.number) + " " + std::to_string(value) + " ";
-    }
+    // Bypass every step so the run stays fast; other values are written and read back exactly.
+    const std::string text = testsupport::settingsText([](int number, std::int32_t) {
+        const bool mode = std::string_view(shadowParameterTable()[std::size_t(number)].name).ends_with(".mode");
+        return mode ? 0 : (number % 2 ? -3 - number : 1000 + number);
+    });
     Image image = hosttest::patternImage(20, 10, 3, 16, 9);
     const RunResult first = run(text, image);
     ASSERT_TRUE(first.ok()) << first.message();
