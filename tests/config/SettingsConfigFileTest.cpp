@@ -40,16 +40,6 @@ TEST(SettingsConfigFile, CreatesFolderAndEmptyFileThenKeepsChanges) {
     EXPECT_EQ(home.entries(), 1u);
 }
 
-TEST(SettingsConfigFile, LoadsAnExistingFile) {
-    SettingsHome home;
-    vek::testing::writeFile(home.file(), "<settings version=\"4\"><group name=\"General\">"
-                                         "<key name=\"Language\" type=\"string\" value=\"fr\"/></group></settings>");
-    SettingsConfigFile settings;
-    EXPECT_EQ(settings.getConfigurationName(), "settings");
-    EXPECT_EQ(settings.getConfigurationVersion(), "4");
-    EXPECT_EQ(settings.getPropertyAsString("General", "Language"), "fr");
-}
-
 TEST(SettingsConfigFile, AFailedSaveKeepsThePreviousFile) {
     SettingsHome home;
     {
