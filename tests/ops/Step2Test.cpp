@@ -17,15 +17,6 @@ protected:
 // A node's view of a tile: 60 x 60 stored, processing rectangle widened by the border of 20.
 Block tile(int32_t s = 1) { return makeBlock({0, 60, 0, 60}, {-10, 70, 5, 55}, s); }
 
-TEST_F(Step2, Mode104OnUniformBlockIsIdentity) {
-    Block src = tile();
-    for (size_t i = 0; i < src.mem.size(); ++i) src.mem[i] = i % 3 == 0 ? 40000 : 32767;
-    Block dst = copyOf(src);
-    step.mode = 104;
-    step.Process(src.get(), dst.get());
-    EXPECT_EQ(dst.mem, src.mem);
-}
-
 TEST_F(Step2, Mode104MixesTwoThirdsOfInputLuminanceTruncating) {
     Block src = makeBlock({0, 60, 0, 60}, {10, 50, 10, 50});
     fillRandom(src, 3, 0, 6);
