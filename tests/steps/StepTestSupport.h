@@ -55,6 +55,18 @@ inline void expectSamePixels(const KERNEL::cPixelBlock& a, const KERNEL::cPixelB
             ASSERT_EQ(storedPixel(a, c, r), storedPixel(b, c, r)) << "stored pixel " << c << "," << r;
 }
 
+// One pixel value through a step, on a 3 x 1 block at image row `row` filled with it; the step must
+// treat every pixel of the row alike.
+template <class Step>
+Pixel3 runFlat(Step& step, const Pixel3& in, int32_t row = 0) {
+    Image img(3, 1, 0, row);
+    img.fill(in[0], in[1], in[2]);
+    auto src = img.block();
+    auto dst = runStep(step, src.get());
+    for (int32_t x = 1; x < 3; ++x) EXPECT_EQ(pixelAt(*dst, x, row), pixelAt(*dst, 0, row)) << "pixels differ";
+    return pixelAt(*dst, 0, row);
+}
+
 // A host that also counts the filter-rectangle requests.
 class CountingHost : public testsupport::MallocHost {
 public:
