@@ -6,9 +6,9 @@
 
 #include <cstdlib>
 #include <filesystem>
-#include <fstream>
-#include <sstream>
 #include <string>
+
+#include "lib/TestFiles.h"
 
 namespace clitest {
 
@@ -17,12 +17,7 @@ struct Outcome {
     std::string out, err;
 };
 
-inline std::string readFile(const std::filesystem::path& p) {
-    std::ifstream in(p, std::ios::binary);
-    std::stringstream s;
-    s << in.rdbuf();
-    return s.str();
-}
+using vek::testing::readFile;
 
 inline std::string q(const std::filesystem::path& p) { return "'" + p.string() + "'"; }
 
