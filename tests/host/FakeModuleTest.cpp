@@ -55,7 +55,7 @@ TEST_P(FakeTiling, ResultIsIndependentOfTheTiling) {
 
 INSTANTIATE_TEST_SUITE_P(
     Host, FakeTiling,
-    ::testing::Values(TilingCase{1, 1, 3, 8, "op=invert", {}}, TilingCase{23, 17, 3, 8, "tile=5 margin=2", {}},
+    ::testing::Values(TilingCase{1, 1, 3, 8, "tile=0", {}}, TilingCase{23, 17, 3, 8, "tile=5 margin=2", {}},
                       TilingCase{23, 17, 4, 8, "tile=5 margin=2 inpad=0", {}},
                       TilingCase{23, 17, 4, 16, "tile=7 margin=3 outmargin=1", {}},
                       TilingCase{9, 8, 3, 16, "tile=8 margin=1 inpad=255 outpad=-2", {}},

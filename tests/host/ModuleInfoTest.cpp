@@ -225,7 +225,6 @@ TEST(ModuleInfo, PiplAddedToFakeModuleDecidesEntryAndModes) {
     Image image(4, 3, 3, 8);
     const Image before = image;
     RunOptions options;
-    options.par1 = "op=invert";
     options.parentWindow = false;
     try {
         runFilter(gray, image, options);

@@ -1,6 +1,5 @@
-// A small filter module for testing the host. It lives in a host handle like a real filter and
-// takes its orders from the 'par1' text, a list of key=value words:
-//   op=invert|copy      what to do with RGB (alpha is always carried through)
+// A small filter module for testing the host: it inverts RGB and carries alpha through. It lives in
+// a host handle like a real filter and takes its orders from the 'par1' text, key=value words:
 //   tile=N margin=M     tile size (0: the whole filter rectangle) and input margin
 //   outmargin=1         request the margin in outRect too (writing only the core)
 //   inpad=P outpad=P    padding codes
@@ -8,7 +7,7 @@
 //   buffer=N            allocate, lock and use a scratch buffer of N bytes for every tile
 //   fail=C              return C from the first Continue
 //   color=1             convert every tile's first pixel RGB -> HSB -> RGB through colour services
-// At Finish it records in 'par1': "tiles=T moves=M dres=D colors=C got=<the par1 it received>".
+// At Finish it records in 'par1': "tiles=T colors=C got=<the par1 it received>".
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -19,7 +18,6 @@
 namespace {
 
 struct Config {
-    bool invert = true;
     int tile = 0, margin = 0;
     bool outMargin = false;
     int inPad = -1, outPad = -1;
@@ -34,9 +32,6 @@ struct State {
     Config cfg;
     int tileX = 0, tileY = 0;  // current tile's top-left, relative to the filter rectangle
     long tiles = 0;
-    intptr_t lastAddress = 0;
-    long moves = 0;
-    int dRes = -1;
     long colors = 0;
     pi::BufferID scratch = nullptr;
     char par1[512] = {};
@@ -49,7 +44,6 @@ int value(const char* text, const char* key, int fallback) {
 
 void parse(State& s) {
     Config& c = s.cfg;
-    c.invert = std::strstr(s.par1, "op=copy") == nullptr;
     c.tile = value(s.par1, "tile=", 0);
     c.margin = value(s.par1, "margin=", 0);
     c.outMargin = value(s.par1, "outmargin=", 0) != 0;
@@ -64,16 +58,13 @@ void parse(State& s) {
 void readDescriptor(pi::FilterRecord* r, State& s) {
     pi::PIDescriptorParameters* dp = r->descriptorParameters;
     if (!dp || !dp->descriptor) return;
-    pi::uint32 keys[] = {pi::keyPar1, pi::keyDRes, 0};
+    pi::uint32 keys[] = {pi::keyPar1, 0};
     pi::PIReadDescriptor token = dp->readDescriptorProcs->openReadDescriptorProc(dp->descriptor, keys);
     if (!token) return;
     pi::uint32 key = 0, type = 0;
     pi::int32 flags = 0;
     while (dp->readDescriptorProcs->getKeyProc(token, &key, &type, &flags)) {
-        if (key == pi::keyDRes) {
-            pi::int32 v = 0;
-            if (dp->readDescriptorProcs->getIntegerProc(token, &v) == 0) s.dRes = v;
-        } else if (key == pi::keyPar1) {
+        if (key == pi::keyPar1) {
             pi::Handle text = nullptr;
             if (dp->readDescriptorProcs->getTextProc(token, &text) != 0 || !text) continue;
             const pi::int32 size = r->handleProcs->getSizeProc(text);
@@ -92,8 +83,7 @@ void writeDescriptor(pi::FilterRecord* r, const State& s) {
     pi::PIDescriptorParameters* dp = r->descriptorParameters;
     if (!dp) return;
     char text[700];
-    std::snprintf(text, sizeof text, "tiles=%ld moves=%ld dres=%d colors=%ld got=%s", s.tiles, s.moves, s.dRes,
-                  s.colors, s.par1);
+    std::snprintf(text, sizeof text, "tiles=%ld colors=%ld got=%s", s.tiles, s.colors, s.par1);
     pi::PIWriteDescriptor token = dp->writeDescriptorProcs->openWriteDescriptorProc();
     if (!token) return;
     const auto length = pi::int32(std::strlen(text) + 1);  // with its terminator, like our module
@@ -170,7 +160,7 @@ pi::OSErr process(pi::FilterRecord* r, State& s) {
                 auto* out = static_cast<unsigned char*>(r->outData) + (y - r->outRect.top) * r->outRowBytes +
                             (x - r->outRect.left) * r->outColumnBytes + p * r->outPlaneBytes;
                 unsigned v = bps == 2 ? *reinterpret_cast<const pi::uint16*>(in) : *in;
-                if (s.cfg.invert && p < 3) v = (bps == 2 ? 32768u : 255u) - v;
+                if (p < 3) v = (bps == 2 ? 32768u : 255u) - v;
                 if (scratch) scratch[0] = char(v);  // touch the buffer: a bad address faults here
                 if (bps == 2)
                     *reinterpret_cast<pi::uint16*>(out) = pi::uint16(v);
@@ -261,9 +251,6 @@ extern "C" __attribute__((visibility("default"))) void ENTRYPOINT(pi::int16 sele
     } else {
         s = reinterpret_cast<State*>(r->handleProcs->lockProc(h, 1));
     }
-    if (s->lastAddress && s->lastAddress != reinterpret_cast<intptr_t>(s)) ++s->moves;
-    s->lastAddress = reinterpret_cast<intptr_t>(s);
-
     switch (selector) {
         case pi::filterSelectorPrepare:
             readDescriptor(r, *s);
