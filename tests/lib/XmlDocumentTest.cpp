@@ -1,8 +1,9 @@
+// The XML document in memory: building, writing, parsing and its limits. Its files are read and
+// written through the configuration's tests and the atomic writer's.
 #include <gtest/gtest.h>
 
 #include <string>
 
-#include "lib/TestFiles.h"
 #include "lib/xml/XmlDocumentRapid.h"
 
 namespace {
@@ -81,20 +82,6 @@ TEST(XmlDocument, RefusesNestingBeyondTheLimitWithoutRecursingIntoIt) {
     std::string flat = "<r>";
     for (int i = 0; i < 10000; ++i) flat += "<a/>";
     EXPECT_TRUE(XmlDocumentRapid::fromText(flat + "</r>"));
-}
-
-// Unreadable files (missing, a folder) are covered through the configuration's loading.
-TEST(XmlDocument, MalformedFilesGiveNullAndSavedOnesReadBack) {
-    vek::testing::TempDir dir;
-    vek::testing::writeFile(dir / "bad.xml", "<r><a></r>");
-    EXPECT_EQ(XmlDocumentRapid::fromFile(dir / "bad.xml"), nullptr);
-
-    XmlDocumentRapid doc;
-    doc.createRoot("r").appendChild("a");
-    doc.save(dir / "sub" / "ok.xml", true);
-    const auto back = XmlDocumentRapid::fromFile(dir / "sub" / "ok.xml");
-    ASSERT_TRUE(back);
-    EXPECT_EQ(back->root().firstChild().name(), "a");
 }
 
 TEST(XmlDocument, NamesAreCheckedForUseAsElementNames) {
