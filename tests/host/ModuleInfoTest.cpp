@@ -319,7 +319,11 @@ TEST(ModuleInfo, OtherVendorsUnknownKeysAndUnpaddedLengthsAreSkipped) {
     EXPECT_EQ(info.kind, pi::fourCC("8BFM"));
     EXPECT_EQ(info.name, "Test...");
     EXPECT_EQ(info.category, "**Hidden**");
+    EXPECT_TRUE(info.hidden());
     EXPECT_EQ(info.entryPoint, "ENTRYPOINT");
+    EXPECT_TRUE(info.supportsFilterLayers());
+    ASSERT_TRUE(info.terminology);
+    EXPECT_EQ(info.terminology->terminologyId, 16013);
     ASSERT_TRUE(info.event);
     EXPECT_EQ(info.event->suiteName, "Suite");
     ASSERT_EQ(info.event->parameters.size(), 2u);
