@@ -140,7 +140,7 @@ TEST(Command, BatchGoesOnPastABrokenFileAndFailsAtTheEnd) {
     saveImage(folder / "a.png", hosttest::patternImage(20, 12, 3, 8, 1), FileFormat::Png);
     std::ofstream(folder / "broken.png") << "\x89PNG but not really";
     saveImage(folder / "c.tif", hosttest::patternImage(9, 14, 4, 16, 2), FileFormat::Tiff);
-    const clitest::Outcome o = run(q(folder / "a.png") + " " + q(folder / "broken.png") + " " + q(folder / "c.tif") +
+    clitest::Outcome o = run(q(folder / "a.png") + " " + q(folder / "broken.png") + " " + q(folder / "c.tif") +
                              " -o " + q(folder / "out") + moduleArgument());
     EXPECT_EQ(o.status, 1);
     EXPECT_EQ(lines(o.err), 1u) << o.err;
@@ -149,6 +149,13 @@ TEST(Command, BatchGoesOnPastABrokenFileAndFailsAtTheEnd) {
     EXPECT_EQ(loadImage(folder / "out" / "a.png").image.width, 20);
     EXPECT_EQ(loadImage(folder / "out" / "c.tif").image.channels, 4);
     EXPECT_EQ(hosttest::filesIn(folder / "out"), 2);
+
+    // Quiet: not even the summary.
+    fs::remove_all(folder / "out");
+    fs::create_directories(folder / "out");
+    o = run(q(folder / "a.png") + " " + q(folder / "c.tif") + " -o " + q(folder / "out") + " -q" + moduleArgument());
+    EXPECT_EQ(o.status, 0) << o.err;
+    EXPECT_EQ(o.out, "");
 }
 
 TEST(Command, InPlaceOverwritesOnlyWhenAsked) {
