@@ -219,19 +219,19 @@ bool Session::Impl::anyRectRequested() const {
            !Area::of(record_.maskRect).empty();
 }
 
-std::string Session::Impl::serve(const Raster& image, const Area& area, int lo, int hi, int padding, bool inPlaceAllowed,
-                                 std::vector<std::uint8_t>& buffer, void*& data, std::int32_t& rowBytes,
-                                 bool& copied) const {
-    if (std::string error = checkRequest(image, area, lo, hi, padding); !error.empty()) return error;
+Session::Impl::Served Session::Impl::serve(const Raster& image, const Area& area, int lo, int hi, int padding,
+                                           bool inPlaceAllowed, std::vector<std::uint8_t>& buffer) const {
+    Served s;
+    if (s.error = checkRequest(image, area, lo, hi, padding); !s.error.empty()) return s;
     if (inPlaceAllowed && !options_.copyTiles && servedInPlace(image, area, lo, hi)) {
-        data = image.at(area.left, area.top);
-        rowBytes = std::int32_t(image.rowBytes);
-        return {};
+        s.data = image.at(area.left, area.top);
+        s.rowBytes = std::int32_t(image.rowBytes);
+        return s;
     }
-    if (std::string error = fillArea(image, area, lo, hi, padding, buffer, rowBytes); !error.empty()) return error;
-    data = buffer.data();
-    copied = true;
-    return {};
+    if (s.error = fillArea(image, area, lo, hi, padding, buffer, s.rowBytes); !s.error.empty()) return s;
+    s.data = buffer.data();
+    s.copied = true;
+    return s;
 }
 
 pi::OSErr Session::Impl::serveRequest() {
@@ -244,15 +244,10 @@ pi::OSErr Session::Impl::serveRequest() {
     r.inData = nullptr;
     r.inRowBytes = 0;
     if (!in.empty()) {
-        // The record is packed: its fields are not bound to references.
-        void* data = nullptr;
-        std::int32_t rowBytes = 0;
-        bool copied = false;
-        const std::string error =
-            serve(source_, in, r.inLoPlane, r.inHiPlane, r.inputPadding, true, inBuffer_, data, rowBytes, copied);
-        if (!error.empty()) return hostFault("input: " + error);
-        r.inData = data;
-        r.inRowBytes = rowBytes;
+        const Served s = serve(source_, in, r.inLoPlane, r.inHiPlane, r.inputPadding, true, inBuffer_);
+        if (!s.error.empty()) return hostFault("input: " + s.error);
+        r.inData = s.data;
+        r.inRowBytes = s.rowBytes;
         r.inPlaneBytes = bytesPerSample;
         r.inColumnBytes = (r.inHiPlane - r.inLoPlane + 1) * bytesPerSample;
     }
@@ -263,15 +258,12 @@ pi::OSErr Session::Impl::serveRequest() {
     pending_.active = false;
     if (!out.empty()) {
         // In place only inside the selection: pixels outside it must never change.
-        void* data = nullptr;
-        std::int32_t rowBytes = 0;
-        bool copied = false;
-        const std::string error = serve(target_, out, r.outLoPlane, r.outHiPlane, r.outputPadding,
-                                        out.within(filterArea_), outBuffer_, data, rowBytes, copied);
-        if (!error.empty()) return hostFault("output: " + error);
-        r.outData = data;
-        r.outRowBytes = rowBytes;
-        if (copied) pending_ = {out, r.outLoPlane, r.outHiPlane, r.outRowBytes, true};
+        const Served s = serve(target_, out, r.outLoPlane, r.outHiPlane, r.outputPadding, out.within(filterArea_),
+                               outBuffer_);
+        if (!s.error.empty()) return hostFault("output: " + s.error);
+        r.outData = s.data;
+        r.outRowBytes = s.rowBytes;
+        if (s.copied) pending_ = {out, r.outLoPlane, r.outHiPlane, r.outRowBytes, true};
         r.outPlaneBytes = bytesPerSample;
         r.outColumnBytes = (r.outHiPlane - r.outLoPlane + 1) * bytesPerSample;
     }

@@ -60,10 +60,16 @@ private:
     bool call(pi::int16 selector);
     bool anyRectRequested() const;
     pi::OSErr serveRequest();
-    // Points `data` into `image` for the request, or fills `buffer` with it (`copied`); the error
-    // that refuses the request, if any.
-    std::string serve(const Raster& image, const Area& area, int lo, int hi, int padding, bool inPlaceAllowed,
-                      std::vector<std::uint8_t>& buffer, void*& data, std::int32_t& rowBytes, bool& copied) const;
+    // A request served: pointing into the image, or into `buffer` filled with it (`copied`); or
+    // the error that refuses it.
+    struct Served {
+        std::string error;
+        void* data = nullptr;
+        std::int32_t rowBytes = 0;
+        bool copied = false;
+    };
+    Served serve(const Raster& image, const Area& area, int lo, int hi, int padding, bool inPlaceAllowed,
+                 std::vector<std::uint8_t>& buffer) const;
     void commitPending();
     pi::OSErr hostFault(const std::string& message, pi::OSErr code = pi::paramErr);
     void collectPar1();
